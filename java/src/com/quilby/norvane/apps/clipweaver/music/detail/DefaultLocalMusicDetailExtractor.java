@@ -1,0 +1,71 @@
+package com.quilby.norvane.apps.clipweaver.music.detail;
+
+import java.nio.ByteBuffer;
+
+/**
+ * Finds the beats of a piece of music in native code.
+ *
+ * <p>One instance may serve many calls, one at a time per instance; different
+ * instances may run on different threads at once. Progress is reported to
+ * {@link #shouldCancelExtraction(byte)} on the thread that called
+ * {@link #calculateBeatsInSec}, which also lets the caller cancel.
+ */
+public class DefaultLocalMusicDetailExtractor {
+  static {
+    System.loadLibrary("clipweaver_native");
+  }
+
+  /** Receives progress reports of a running analysis. */
+  @FunctionalInterface
+  public interface ProgressListener {
+    /**
+     * @param percent overall progress, 0 to 99, never decreasing within a call
+     * @return true to cancel the analysis; the call then returns an empty array
+     */
+    boolean onProgress(int percent);
+  }
+
+  private volatile ProgressListener listener;
+
+  /** An extractor without a listener: it reports nowhere and never cancels. */
+  public DefaultLocalMusicDetailExtractor() {}
+
+  /** An extractor that reports progress to {@code listener} (may be null). */
+  public DefaultLocalMusicDetailExtractor(ProgressListener listener) {
+    this.listener = listener;
+  }
+
+  /** Replaces the listener; null removes it. Takes effect at the next report. */
+  public void setProgressListener(ProgressListener listener) {
+    this.listener = listener;
+  }
+
+  /**
+   * Analyses PCM audio and returns its beat times.
+   *
+   * @param pcm a direct buffer of interleaved signed 16-bit little-endian
+   *     samples, channel 0 first in each frame, read from its start address
+   *     (its position is ignored); a heap buffer yields an empty array
+   * @param sizeInBytes bytes to analyse; a trailing partial frame is ignored
+   *     and a size beyond the buffer's capacity is clamped to it
+   * @param sampleRate samples per second of one channel, in Hz
+   * @param channelCount interleaved channels per frame, at least 1
+   * @return beat times in seconds from the start of the buffer, ascending;
+   *     empty when the input is too short, silent, invalid or the analysis was
+   *     cancelled. The caller owns the array.
+   */
+  public native float[] calculateBeatsInSec(
+      ByteBuffer pcm, int sizeInBytes, int sampleRate, int channelCount);
+
+  /**
+   * Called by the native analysis with its progress, on the calling thread.
+   * Override it, or set a {@link ProgressListener}, to follow or cancel.
+   *
+   * @param progress overall progress, 0 to 99
+   * @return true to cancel the analysis
+   */
+  public boolean shouldCancelExtraction(byte progress) {
+    ProgressListener current = listener;
+    return current != null && current.onProgress(progress);
+  }
+}

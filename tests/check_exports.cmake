@@ -1,0 +1,26 @@
+# Every dynamic symbol that the library defines must be a JNI entry under
+# the version VERS_1.0.
+execute_process(COMMAND readelf --dyn-syms --wide ${LIBRARY}
+  OUTPUT_VARIABLE _symbols RESULT_VARIABLE _status)
+if(NOT _status EQUAL 0)
+  message(FATAL_ERROR "readelf failed on ${LIBRARY}")
+endif()
+string(REPLACE "\n" ";" _lines "${_symbols}")
+set(_exported 0)
+foreach(_line IN LISTS _lines)
+  # Defined symbols have a section index, undefined ones UND.
+  if(_line MATCHES "^ *[0-9]+: [0-9a-f]+ +[0-9]+ +(FUNC|OBJECT) +(GLOBAL|WEAK) +DEFAULT +[0-9]+ +([^ ]+)")
+    set(_name ${CMAKE_MATCH_3})
+    if(_name STREQUAL "VERS_1.0")
+      continue()
+    endif()
+    if(NOT _name MATCHES "^Java_[A-Za-z0-9_]+@@VERS_1\\.0$")
+      message(FATAL_ERROR "unexpected export: ${_name}")
+    endif()
+    math(EXPR _exported "${_exported} + 1")
+  endif()
+endforeach()
+if(_exported EQUAL 0)
+  message(FATAL_ERROR "no JNI entry exported")
+endif()
+message(STATUS "${_exported} JNI entries exported under VERS_1.0")
