@@ -1,0 +1,168 @@
+package com.quilby.norvane.apps.clipweaver.music.detail;
+
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertThrows;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import java.nio.ByteBuffer;
+import java.util.ArrayList;
+import java.util.List;
+import java.util.concurrent.ExecutorService;
+import java.util.concurrent.Executors;
+import java.util.concurrent.Future;
+import org.junit.jupiter.api.Test;
+import org.junit.jupiter.params.ParameterizedTest;
+import org.junit.jupiter.params.provider.CsvSource;
+
+class DefaultLocalMusicDetailExtractorTest {
+  private static final String FAILED = "Failed to retrieve beats from APM!";
+  private static final String NONE = "Gets 0 beats from APM!";
+
+  private static List<String> logOf(String scenario) throws Exception {
+    ChildJvm child = ChildJvm.run(BeatScenario.class, scenario);
+    assertEquals(0, child.exitCode, child.stderr);
+    return child.nativeTexts();
+  }
+
+  @Test
+  void failuresLogTheirStageAndReturnNothing() throws Exception {
+    assertEquals(
+        List.of("Channels are less than one!", FAILED, NONE), logOf("channels-zero"));
+    assertEquals(List.of("Input samples size: 0", FAILED, NONE), logOf("one-byte"));
+    assertEquals(
+        List.of(
+            "Input samples size: 100",
+            "Empty input for onset detector! ",
+            "Onset process failed!",
+            FAILED,
+            NONE),
+        logOf("shorter-than-window"));
+    assertEquals(
+        List.of(
+            "Input samples size: 352800",
+            "Failed to compute spectrogram!",
+            "Spectrogram process failed!",
+            FAILED,
+            NONE),
+        logOf("cancel-first"));
+  }
+
+  @Test
+  void cancellingAtTheOnsetStageStopsAfterTheSpectrogram() throws Exception {
+    ChildJvm child = ChildJvm.run(BeatScenario.class, "cancel-onset");
+    List<String> log = child.nativeTexts();
+    assertEquals(
+        List.of("Input samples size: 352800", "Onset process failed!", FAILED, NONE), log);
+    String[] lines = child.stdout.split("\n");
+    assertEquals("0", lines[1]);
+    List<Integer> bytes = parseList(lines[0]);
+    assertEquals(33, bytes.get(bytes.size() - 1));
+    for (int b : bytes.subList(0, bytes.size() - 1)) assertTrue(b >= 0 && b <= 32, lines[0]);
+  }
+
+  @Test
+  void badBuffersAndSilenceEndWithoutBeats() throws Exception {
+    List<String> heap = logOf("heap-buffer");
+    assertEquals(1, heap.size(), heap.toString());
+
+    List<String> silence = logOf("silence");
+    assertEquals("Input samples size: 44100", silence.get(0));
+    assertEquals(NONE, silence.get(silence.size() - 1));
+    assertTrue(silence.stream().noneMatch(l -> l.contains("Estimated BPM")), silence.toString());
+
+    List<String> oversized = logOf("oversized");
+    assertTrue(oversized.get(0).contains("capacity"), oversized.toString());
+    assertEquals("Input samples size: 352800", oversized.get(1));
+  }
+
+  @Test
+  void successLogsTheTempoAndTheBeatCount() throws Exception {
+    ChildJvm child = ChildJvm.run(BeatScenario.class, "success");
+    List<String> log = child.nativeTexts();
+    int beats = Integer.parseInt(child.stdout.split("\n")[1]);
+    assertTrue(beats > 10, child.stdout);
+    assertEquals("Gets " + beats + " beats from APM!", log.get(log.size() - 1));
+    assertTrue(log.contains("Estimated BPM = 120"), log.toString());
+    assertTrue(log.contains("Preprocess done. apm input size: 797"), log.toString());
+  }
+
+  @ParameterizedTest
+  @CsvSource({"44100, 2", "48000, 1", "22050, 1"})
+  void findsTheBeatsOfA120BpmGroove(int sampleRate, int channels) {
+    List<Integer> progress = new ArrayList<>();
+    DefaultLocalMusicDetailExtractor extractor =
+        new DefaultLocalMusicDetailExtractor(p -> !progress.add(p));
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(30, sampleRate, channels, 120));
+    float[] beats = extractor.calculateBeatsInSec(pcm, pcm.capacity(), sampleRate, channels);
+
+    assertEquals(0.5, TestTracks.medianInterval(beats), 0.005);
+    for (int i = 1; i < beats.length; i++) assertTrue(beats[i] > beats[i - 1]);
+    assertEquals(0, progress.get(0));
+    assertTrue(progress.contains(33) && progress.contains(66), progress.toString());
+    for (int i = 1; i < progress.size(); i++) {
+      assertTrue(progress.get(i) >= progress.get(i - 1), progress.toString());
+    }
+    assertTrue(progress.get(progress.size() - 1) <= 98);
+  }
+
+  @Test
+  void equalStereoChannelsGiveTheBeatsOfOneAndTrailingBytesAreIgnored() {
+    DefaultLocalMusicDetailExtractor extractor = new DefaultLocalMusicDetailExtractor();
+    short[] stereo = TestTracks.groove(12, 44100, 2, 100);
+    ByteBuffer stereoPcm = TestTracks.direct(stereo);
+    ByteBuffer monoPcm = TestTracks.direct(TestTracks.firstChannel(stereo, 2));
+    float[] fromStereo =
+        extractor.calculateBeatsInSec(stereoPcm, stereoPcm.capacity(), 44100, 2);
+    float[] fromMono = extractor.calculateBeatsInSec(monoPcm, monoPcm.capacity(), 44100, 1);
+    float[] withPartialFrame =
+        extractor.calculateBeatsInSec(stereoPcm, stereoPcm.capacity() - 1, 44100, 2);
+    assertTrue(fromMono.length > 10);
+    assertArrayEquals(fromMono, fromStereo);
+    assertArrayEquals(fromMono, withPartialFrame);
+  }
+
+  @Test
+  void resultsAreTheSameOnEveryThread() throws Exception {
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(10, 44100, 1, 128));
+    float[] expected =
+        new DefaultLocalMusicDetailExtractor().calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1);
+    ExecutorService pool = Executors.newFixedThreadPool(4);
+    try {
+      List<Future<float[]>> runs = new ArrayList<>();
+      for (int i = 0; i < 8; i++) {
+        runs.add(
+            pool.submit(
+                () ->
+                    new DefaultLocalMusicDetailExtractor()
+                        .calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1)));
+      }
+      for (Future<float[]> run : runs) assertArrayEquals(expected, run.get());
+    } finally {
+      pool.shutdown();
+    }
+  }
+
+  @Test
+  void anExceptionFromTheProgressMethodReachesTheCaller() {
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(3, 44100, 1, 120));
+    DefaultLocalMusicDetailExtractor extractor =
+        new DefaultLocalMusicDetailExtractor(
+            p -> {
+              throw new IllegalStateException("listener failed at " + p);
+            });
+    IllegalStateException thrown =
+        assertThrows(
+            IllegalStateException.class,
+            () -> extractor.calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1));
+    assertEquals("listener failed at 0", thrown.getMessage());
+  }
+
+  private static List<Integer> parseList(String text) {
+    List<Integer> values = new ArrayList<>();
+    for (String part : text.replaceAll("[\\[\\] ]", "").split(",")) {
+      if (!part.isEmpty()) values.add(Integer.parseInt(part));
+    }
+    return values;
+  }
+}

@@ -1,0 +1,268 @@
+#include "jni/apm/audio_analyzer.h"
+
+#include <jni.h>
+
+#include <algorithm>
+#include <cmath>
+#include <cstring>
+
+#include "base/logging.h"
+
+namespace apm {
+namespace {
+
+constexpr float kWindowLengthSeconds = 0.04f;
+constexpr float kOverlapSeconds = 0.03f;
+
+// Mono samples mixed per block; bounds the memory of the mix-down whatever
+// the length of the input.
+constexpr int32_t kBlockFrames = 16384;
+
+int16_t ReadSample(const uint8_t* bytes) {
+  return static_cast<int16_t>(bytes[0] | (bytes[1] << 8));
+}
+
+}  // namespace
+
+void SubtractRunningMedian(int32_t window_length, std::vector<float>* values) {
+  std::vector<float>& x = *values;
+  const int64_t n = static_cast<int64_t>(x.size());
+  const int64_t half = window_length / 2;
+  std::vector<float> window;
+  window.reserve(static_cast<size_t>(std::min<int64_t>(n, 2 * half + 1)));
+  for (int64_t i = 0; i < n; ++i) {
+    const int64_t lo = std::max<int64_t>(i - half, 0);
+    const int64_t hi = std::min<int64_t>(i + half + 1, n);
+    window.assign(x.begin() + lo, x.begin() + hi);
+    auto middle = window.begin() + (hi - lo) / 2;
+    std::nth_element(window.begin(), middle, window.end());
+    const float d = x[i] - *middle;
+    x[i] = d > 0 ? d : 0;
+  }
+}
+
+bool NormalizeDetectionFunction(std::vector<float>* values) {
+  if (values->empty()) return false;
+  const float largest = *std::max_element(values->begin(), values->end());
+  if (!(largest > 0) || !std::isfinite(largest)) return false;
+  for (float& v : *values) v = std::sqrt(v / largest);
+  return true;
+}
+
+AudioAnalyzer::AudioAnalyzer(int32_t sample_rate)
+    : sample_rate_(sample_rate),
+      spectrogram_calculator_(kWindowLengthSeconds, kOverlapSeconds) {}
+
+AudioAnalyzer::~AudioAnalyzer() = default;
+
+int32_t AudioAnalyzer::CalculateBeats(
+    const uint8_t* data, int32_t size_in_bytes, int32_t channel_count,
+    std::function<bool(char)> progress_callback) {
+  const std::function<bool(float)> stage_progress =
+      [this, progress_callback](float fraction) {
+        const float overall = std::fma(fraction, 33.0f,
+                                       static_cast<float>(33 * stage_));
+        return progress_callback &&
+               progress_callback(static_cast<char>(static_cast<int>(overall)));
+      };
+  ReleaseBeats();
+  tracker_.reset();
+  if (!MixDownToMono(data, size_in_bytes, channel_count)) return -1;
+  if (!RunPipeline(stage_progress)) return -1;
+  return GetBeats();
+}
+
+void AudioAnalyzer::ReleaseBeats() { beats_.reset(); }
+
+// Only checks and sizes the input: the samples are mixed block by block as
+// the spectrogram consumes them.
+bool AudioAnalyzer::MixDownToMono(const uint8_t* data, int32_t size_in_bytes,
+                                  int32_t channel_count) {
+  if (channel_count < 1) {
+    LOG(ERROR) << "Channels are less than one!";
+    return false;
+  }
+  const int64_t frame_size = 2 * static_cast<int64_t>(channel_count);
+  sample_count_ = data == nullptr || size_in_bytes < frame_size
+                      ? 0
+                      : static_cast<int32_t>(size_in_bytes / frame_size);
+  pcm_ = data;
+  channel_count_ = channel_count;
+  LOG(INFO) << "Input samples size: " << sample_count_;
+  return sample_count_ > 0;
+}
+
+bool AudioAnalyzer::RunPipeline(
+    const std::function<bool(float)>& stage_progress) {
+  if (!ComputeDetectionFunction(stage_progress)) return false;
+
+  SubtractRunningMedian(2 * frames_per_second_ + 1, &detection_function_);
+  const bool has_onsets = NormalizeDetectionFunction(&detection_function_);
+  LOG(INFO) << "Preprocess done. apm input size: "
+            << detection_function_.size();
+  if (!has_onsets) {
+    LOG(ERROR) << "No onsets above the running median (silent or steady "
+                  "input): no beats to track.";
+    return true;
+  }
+
+  const ApmConfig config;
+  tracker_ = std::make_unique<Apm>(config, detection_function_,
+                                   frames_per_second_);
+  stage_ = 2;
+  tracker_->Run(stage_progress);
+  return true;
+}
+
+// The spectrogram and the onset detector run side by side over blocks of
+// the input, frame by frame, so neither the mono signal nor the spectrogram
+// is ever held whole. The onset stage's progress reports and its
+// cancellation point follow once the spectrogram is done, exactly where a
+// separate pass over the stored frames would make them.
+bool AudioAnalyzer::ComputeDetectionFunction(
+    const std::function<bool(float)>& stage_progress) {
+  stage_ = 0;
+  spectrogram_calculator_.Initialize(static_cast<double>(sample_rate_));
+  frames_per_second_ = spectrogram_calculator_.frames_per_second();
+  detection_function_.clear();
+  frame_.resize(spectrogram_calculator_.bin_count());
+  onset_detector_.Reset(spectrogram_calculator_.bin_count());
+
+  const auto detect = [this](const double* bins) {
+    for (size_t k = 0; k < frame_.size(); ++k) {
+      frame_[k] = {static_cast<float>(bins[2 * k]),
+                   static_cast<float>(bins[2 * k + 1])};
+    }
+    detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
+  };
+  spectrogram_calculator_.BeginStream(sample_count_);
+  samples_.resize(std::min(sample_count_, kBlockFrames));
+  const int64_t frame_size = 2 * static_cast<int64_t>(channel_count_);
+  for (int32_t first = 0; first < sample_count_; first += kBlockFrames) {
+    const int32_t count = std::min(kBlockFrames, sample_count_ - first);
+    const uint8_t* frame = pcm_ + first * frame_size;
+    for (int32_t i = 0; i < count; ++i, frame += frame_size) {
+      float sum = 0;
+      for (int32_t c = 0; c < channel_count_; ++c) {
+        sum += static_cast<float>(ReadSample(frame + 2 * c));
+      }
+      samples_[i] = sum / static_cast<float>(channel_count_);
+    }
+    if (!spectrogram_calculator_.StreamBlock(samples_.data(), count,
+                                             stage_progress, detect)) {
+      LOG(ERROR) << "Spectrogram process failed!";
+      return false;
+    }
+  }
+  spectrogram_calculator_.EndStream();
+
+  stage_ = 1;
+  const int32_t frame_count = static_cast<int32_t>(detection_function_.size());
+  if (!onset_detector_.ReplayPass(frame_count, stage_progress)) {
+    LOG(ERROR) << "Onset process failed!";
+    return false;
+  }
+  return true;
+}
+
+int32_t AudioAnalyzer::GetBeats() {
+  std::vector<double> times;
+  if (tracker_) {
+    LOG(INFO) << "Estimated BPM = " << tracker_->bpm();
+    times = tracker_->beat_times();
+  }
+  beats_ = std::make_unique<float[]>(times.size());
+  for (size_t i = 0; i < times.size(); ++i) {
+    beats_[i] = static_cast<float>(times[i]);
+  }
+  return static_cast<int32_t>(times.size());
+}
+
+}  // namespace apm
+
+namespace {
+
+// Calls the receiver's shouldCancelExtraction(byte). A Java exception from
+// it cancels the analysis and stays pending for the Java caller; no further
+// call into Java is made after it.
+class JavaProgress {
+ public:
+  JavaProgress(JNIEnv* env, jobject receiver) : env_(env), receiver_(receiver) {
+    jclass receiver_class = env->GetObjectClass(receiver);
+    method_ = env->GetMethodID(receiver_class, "shouldCancelExtraction", "(B)Z");
+    if (method_ == nullptr) env->ExceptionClear();
+    env->DeleteLocalRef(receiver_class);
+    if (method_ == nullptr) {
+      LOG(WARNING) << "shouldCancelExtraction(byte) not found: running "
+                      "without progress reports.";
+    }
+  }
+
+  bool operator()(char progress) {
+    if (threw_) return true;
+    if (method_ == nullptr) return false;
+    const jboolean cancel = env_->CallBooleanMethod(
+        receiver_, method_, static_cast<jbyte>(progress));
+    if (env_->ExceptionCheck()) {
+      threw_ = true;
+      return true;
+    }
+    return cancel != JNI_FALSE;
+  }
+
+  bool threw() const { return threw_; }
+
+ private:
+  JNIEnv* env_;
+  jobject receiver_;
+  jmethodID method_ = nullptr;
+  bool threw_ = false;
+};
+
+// The bytes of a direct buffer that may be read, or null for a buffer
+// without an address; a size beyond the capacity is clamped to it.
+const uint8_t* DirectPcm(JNIEnv* env, jobject buffer, jint* size_in_bytes) {
+  if (buffer == nullptr) return nullptr;
+  const jlong capacity = env->GetDirectBufferCapacity(buffer);
+  void* address = env->GetDirectBufferAddress(buffer);
+  if (capacity < 0 || (address == nullptr && capacity > 0)) return nullptr;
+  if (*size_in_bytes > capacity) {
+    LOG(WARNING) << "PCM size " << *size_in_bytes
+                 << " bytes exceeds the buffer capacity of " << capacity
+                 << " bytes; analysing the capacity.";
+    *size_in_bytes = static_cast<jint>(capacity);
+  }
+  // An empty direct buffer may have no address; it simply has no samples.
+  static const uint8_t kNoSamples = 0;
+  return address != nullptr ? static_cast<const uint8_t*>(address)
+                            : &kNoSamples;
+}
+
+}  // namespace
+
+extern "C" JNIEXPORT jfloatArray JNICALL
+Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtractor_calculateBeatsInSec(
+    JNIEnv* env, jobject receiver, jobject pcm_buffer, jint size_in_bytes,
+    jint sample_rate, jint channel_count) {
+  if (env == nullptr || receiver == nullptr) return nullptr;
+  const uint8_t* data = DirectPcm(env, pcm_buffer, &size_in_bytes);
+  if (data == nullptr) {
+    LOG(ERROR) << "The PCM buffer is not a direct buffer: nothing analysed.";
+    return env->NewFloatArray(0);
+  }
+  apm::AudioAnalyzer analyzer(sample_rate);
+  JavaProgress java_progress(env, receiver);
+  int32_t n = analyzer.CalculateBeats(
+      data, size_in_bytes, channel_count,
+      [&java_progress](char progress) { return java_progress(progress); });
+  if (n < 0) {
+    LOG(ERROR) << "Failed to retrieve beats from APM!";
+    n = 0;
+  }
+  LOG(INFO) << "Gets " << n << " beats from APM!";
+  if (java_progress.threw()) return nullptr;
+  jfloatArray beats = env->NewFloatArray(n);
+  if (beats == nullptr) return nullptr;
+  if (n > 0) env->SetFloatArrayRegion(beats, 0, n, analyzer.beats());
+  return beats;
+}
