@@ -1,0 +1,88 @@
+// Cost of the beat analysis: the spectral front end over a minute of audio,
+// and the whole analysis of a three-minute stereo track, stage by stage.
+#include <benchmark/benchmark.h>
+#include <sys/resource.h>
+
+#include <chrono>
+#include <cmath>
+#include <cstring>
+#include <vector>
+
+#include "jni/apm/audio_analyzer.h"
+
+namespace {
+
+constexpr int kRate = 44100;
+
+// Kicks every half second over low noise: a steady 120 BPM pulse.
+std::vector<int16_t> Pulse(double seconds, int channels) {
+  const size_t frames = static_cast<size_t>(seconds * kRate);
+  std::vector<int16_t> pcm(frames * channels);
+  uint32_t noise = 12345;
+  for (size_t i = 0; i < frames; ++i) {
+    noise = noise * 1664525u + 1013904223u;
+    const double t = static_cast<double>(i) / kRate;
+    const double since = std::fmod(t, 0.5);
+    const double kick = 16000 * std::exp(-since * 25) * std::sin(2 * M_PI * 70 * since);
+    const int16_t v = static_cast<int16_t>(kick + static_cast<int>(noise >> 22) - 512);
+    for (int c = 0; c < channels; ++c) pcm[i * channels + c] = v;
+  }
+  return pcm;
+}
+
+void BM_SpectrogramAndOnsets60s(benchmark::State& state) {
+  const std::vector<int16_t> pcm = Pulse(60, 1);
+  const std::vector<float> mono(pcm.begin(), pcm.end());
+  const apm::ProgressCallback none = [](float) { return false; };
+  std::vector<apm::SpectrogramFrame> frames;
+  std::vector<float> detection;
+  for (auto _ : state) {
+    apm::SpectrogramCalculator calculator(0.04f, 0.03f);
+    calculator.Initialize(kRate);
+    calculator.ComputeSpectrogram(mono, &frames, none);
+    apm::OnsetDetector detector;
+    detection.clear();
+    detector.ComputeDetectionFunction(frames, &detection, none, false);
+    benchmark::DoNotOptimize(detection.data());
+  }
+  state.counters["realtime_x"] = benchmark::Counter(
+      60.0 * state.iterations(), benchmark::Counter::kIsRate);
+}
+BENCHMARK(BM_SpectrogramAndOnsets60s)->Unit(benchmark::kMillisecond);
+
+// Stage times come from the progress reports: everything up to the first
+// report of the tracking stage (mix-down, spectrogram and onsets, which run
+// interleaved, then conditioning and the tracker's set-up), and the
+// tracker's pass from there to the end.
+void BM_WholeAnalysis180sStereo(benchmark::State& state) {
+  using Clock = std::chrono::steady_clock;
+  const std::vector<int16_t> pcm = Pulse(180, 2);
+  const auto* bytes = reinterpret_cast<const uint8_t*>(pcm.data());
+  const int32_t size = static_cast<int32_t>(pcm.size() * 2);
+  double front = 0, tracker = 0, total = 0;
+  for (auto _ : state) {
+    apm::AudioAnalyzer analyzer(kRate);
+    const auto start = Clock::now();
+    Clock::time_point tracking_start = start;
+    const int32_t beats = analyzer.CalculateBeats(bytes, size, 2, [&](char p) {
+      if (p == 66 && tracking_start == start) tracking_start = Clock::now();
+      return false;
+    });
+    const auto end = Clock::now();
+    benchmark::DoNotOptimize(beats);
+    front += std::chrono::duration<double>(tracking_start - start).count();
+    tracker += std::chrono::duration<double>(end - tracking_start).count();
+    total += std::chrono::duration<double>(end - start).count();
+  }
+  const double n = static_cast<double>(state.iterations());
+  state.counters["front_end_s"] = front / n;
+  state.counters["tracking_s"] = tracker / n;
+  state.counters["tracker_share"] = tracker / total;
+  state.counters["realtime_x"] = 180.0 * n / total;
+  rusage usage;
+  getrusage(RUSAGE_SELF, &usage);
+  state.counters["peak_rss_mib"] = usage.ru_maxrss / 1024.0;
+}
+BENCHMARK(BM_WholeAnalysis180sStereo)->Unit(benchmark::kMillisecond)->Iterations(3);
+
+}  // namespace
