@@ -2,13 +2,15 @@
 
 #include <cmath>
 
+#include "base/float4.h"
 #include "base/logging.h"
 
 namespace apm {
 namespace {
 
-constexpr float kPi = 3.14159274f;
-constexpr float kMinusTwoPi = -6.28318548f;
+// The phasor of the phase -pi (as the float nearest to pi).
+constexpr float kStartPhasorRe = -1.0f;
+constexpr float kStartPhasorIm = 8.742278e-8f;
 
 // Sums four lanes side by side, then the lanes pairwise, then the bins that
 // do not fill a lane group, so the result is the same on every vector width.
@@ -62,38 +64,64 @@ bool OnsetDetector::ReplayPass(int32_t frame_count,
 
 void OnsetDetector::Reset(int32_t bin_count) {
   bin_count_ = bin_count;
-  previous_magnitudes_.assign(bin_count, {0.0f, 0.0f});
-  previous_phases_.assign(bin_count, -kPi);
-  second_previous_phases_.assign(bin_count, -kPi);
-  magnitudes_.resize(bin_count);
-  phases_.resize(bin_count);
+  previous_magnitudes_.assign(bin_count, 0.0f);
+  previous_phasors_re_.assign(bin_count, kStartPhasorRe);
+  previous_phasors_im_.assign(bin_count, kStartPhasorIm);
+  second_previous_phasors_re_.assign(bin_count, kStartPhasorRe);
+  second_previous_phasors_im_.assign(bin_count, kStartPhasorIm);
   distances_.resize(bin_count);
 }
 
+// One step for bins k .. k + lanes - 1, lanes being 4 for Float4 and 1 for
+// float; both compute the same bits.
+template <typename V>
+inline void DetectBins(const float* bins, int32_t k, float* previous_magnitude,
+                       float* u1_re, float* u1_im, float* u2_re, float* u2_im,
+                       float* distance) {
+  using simd::Load;
+  V re, im;
+  simd::LoadComplex(bins + 2 * k, &re, &im);
+  const V magnitude = simd::Sqrt(re * re + im * im);
+  // A silent bin gets the phasor (1, 0) of phase 0, as atan2(0, 0) says;
+  // dividing by magnitude + 1 there is dividing by 1.
+  const V silent = simd::OneIfZero(magnitude);
+  const V inverse = simd::Splat<V>(1.0f) / (magnitude + silent);
+  const V u_re = re * inverse + silent;
+  const V u_im = im * inverse;
+  // The phase advanced by the last step: u1 * u1 * conj(u2).
+  const V p1_re = Load<V>(u1_re + k), p1_im = Load<V>(u1_im + k);
+  const V p2_re = Load<V>(u2_re + k), p2_im = Load<V>(u2_im + k);
+  const V a_re = p1_re * p1_re - p1_im * p1_im;
+  const V a_im = simd::Splat<V>(2.0f) * p1_re * p1_im;
+  const V predicted_re = a_re * p2_re + a_im * p2_im;
+  const V predicted_im = a_im * p2_re - a_re * p2_im;
+  const V p = Load<V>(previous_magnitude + k);
+  const V d_re = p * predicted_re - re;
+  const V d_im = p * predicted_im - im;
+  simd::Store(distance + k, simd::Sqrt(d_re * d_re + d_im * d_im));
+  simd::Store(previous_magnitude + k, magnitude);
+  simd::Store(u2_re + k, p1_re);
+  simd::Store(u2_im + k, p1_im);
+  simd::Store(u1_re + k, u_re);
+  simd::Store(u1_im + k, u_im);
+}
+
 float OnsetDetector::DetectFrame(const std::complex<float>* bins) {
-  for (int32_t k = 0; k < bin_count_; ++k) {
-    magnitudes_[k] = std::hypot(bins[k].real(), bins[k].imag());
-    phases_[k] = std::atan2(bins[k].imag(), bins[k].real());
+  const float* x = reinterpret_cast<const float*>(bins);
+  float* state[] = {previous_magnitudes_.data(),
+                    previous_phasors_re_.data(),
+                    previous_phasors_im_.data(),
+                    second_previous_phasors_re_.data(),
+                    second_previous_phasors_im_.data(),
+                    distances_.data()};
+  int32_t k = 0;
+  for (; k + 4 <= bin_count_; k += 4) {
+    DetectBins<simd::Float4>(x, k, state[0], state[1], state[2], state[3],
+                             state[4], state[5]);
   }
-  for (int32_t k = 0; k < bin_count_; ++k) {
-    // Deviation of this phase from the linear prediction, shifted by pi and
-    // wrapped back into (-pi, pi].
-    const float shifted =
-        ((phases_[k] - 2.0f * previous_phases_[k]) + second_previous_phases_[k]) +
-        kPi;
-    const float wrapped =
-        kPi + (shifted - kMinusTwoPi * std::floor(shifted / kMinusTwoPi));
-    const float re = previous_magnitudes_[k].real() -
-                     magnitudes_[k] * std::cos(wrapped);
-    const float im = 0.0f - magnitudes_[k] * std::sin(wrapped);
-    distances_[k] = (std::isinf(re) || std::isinf(im))
-                        ? INFINITY
-                        : std::sqrt(re * re + im * im);
-  }
-  for (int32_t k = 0; k < bin_count_; ++k) {
-    previous_magnitudes_[k] = {magnitudes_[k], 0.0f};
-    second_previous_phases_[k] = previous_phases_[k];
-    previous_phases_[k] = phases_[k];
+  for (; k < bin_count_; ++k) {
+    DetectBins<float>(x, k, state[0], state[1], state[2], state[3], state[4],
+                      state[5]);
   }
   return LaneSum(distances_.data(), bin_count_);
 }

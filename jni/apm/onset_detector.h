@@ -3,6 +3,11 @@
 // last phase step); a frame's value is the summed distance between the
 // predictions and the actual bins. Steady tones score near zero, new energy
 // and phase jumps score high.
+//
+// Phases are carried as unit phasors (X / |X|) rather than angles: the
+// prediction u1 * u1 * conj(u2) is then a few products instead of atan2,
+// cos and sin per bin, and the loops vectorise. Before the first frames the
+// magnitudes count as 0 and the phases as -pi.
 #ifndef CLIPWEAVER_JNI_APM_ONSET_DETECTOR_H_
 #define CLIPWEAVER_JNI_APM_ONSET_DETECTOR_H_
 
@@ -37,12 +42,13 @@ class OnsetDetector {
   static bool EmptyInput();
 
   int32_t bin_count_ = 0;
-  std::vector<std::complex<float>> previous_magnitudes_;
-  std::vector<float> previous_phases_;
-  std::vector<float> second_previous_phases_;
+  // Frame t - 1: magnitudes and unit phasors; frame t - 2: unit phasors.
+  std::vector<float> previous_magnitudes_;
+  std::vector<float> previous_phasors_re_;
+  std::vector<float> previous_phasors_im_;
+  std::vector<float> second_previous_phasors_re_;
+  std::vector<float> second_previous_phasors_im_;
   // Per-frame scratch, sized with the state.
-  std::vector<float> magnitudes_;
-  std::vector<float> phases_;
   std::vector<float> distances_;
 };
 

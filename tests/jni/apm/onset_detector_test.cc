@@ -89,6 +89,28 @@ TEST(OnsetDetector, ValuesFollowThePhasePrediction) {
   }
 }
 
+// Bins run four at a time with a one-at-a-time tail; both must give the same
+// bits, which equal bins in every position reveal.
+TEST(OnsetDetector, VectorAndTailBinsAgreeExactly) {
+  auto frames = [](int bins) {
+    std::vector<SpectrogramFrame> spectrogram;
+    for (int t = 0; t < 4; ++t) {
+      spectrogram.emplace_back(bins, std::polar(1000.0f + 37 * t, 0.7f + 1.9f * t));
+    }
+    spectrogram[2].assign(bins, {0.0f, 0.0f});
+    return spectrogram;
+  };
+  OnsetDetector detector;
+  std::vector<float> one, four, five;
+  ASSERT_TRUE(detector.ComputeDetectionFunction(frames(1), &one, kNoProgress, true));
+  ASSERT_TRUE(detector.ComputeDetectionFunction(frames(4), &four, kNoProgress, true));
+  ASSERT_TRUE(detector.ComputeDetectionFunction(frames(5), &five, kNoProgress, true));
+  for (int t = 0; t < 4; ++t) {
+    EXPECT_EQ(four[t], 4 * one[t]) << t;
+    EXPECT_EQ(five[t], four[t] + one[t]) << t;
+  }
+}
+
 TEST(OnsetDetector, ProgressCancellationAndAppending) {
   const auto spectrogram = SteadyTone(250, 4);
   OnsetDetector detector;
