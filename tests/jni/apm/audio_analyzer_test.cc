@@ -58,7 +58,7 @@ std::vector<uint8_t> Clicks(double seconds, int rate, int channels, double perio
   return pcm;
 }
 
-struct Run {
+struct Outcome {
   int32_t count;
   std::vector<int> progress;
   std::vector<float> beats;
@@ -66,9 +66,9 @@ struct Run {
   std::string log;
 };
 
-Run Analyze(const std::vector<uint8_t>& pcm, int32_t size, int rate, int channels,
+Outcome Analyze(const std::vector<uint8_t>& pcm, int32_t size, int rate, int channels,
             int cancel_at = 1000) {
-  Run run;
+  Outcome run;
   AudioAnalyzer analyzer(rate);
   testing::internal::CaptureStderr();
   run.count = analyzer.CalculateBeats(pcm.data(), size, channels, [&](char p) {
@@ -84,7 +84,7 @@ Run Analyze(const std::vector<uint8_t>& pcm, int32_t size, int rate, int channel
 TEST(AudioAnalyzer, StreamingGivesTheDetectionFunctionOfTheWholeSignal) {
   const int rate = 22050;
   const std::vector<uint8_t> pcm = Clicks(40, rate, 2, 0.5);
-  const Run run = Analyze(pcm, static_cast<int32_t>(pcm.size()), rate, 2);
+  const Outcome run = Analyze(pcm, static_cast<int32_t>(pcm.size()), rate, 2);
 
   // The same stages over the whole mono signal at once.
   std::vector<float> mono(pcm.size() / 4);
@@ -122,7 +122,7 @@ TEST(AudioAnalyzer, StreamingGivesTheDetectionFunctionOfTheWholeSignal) {
 
 TEST(AudioAnalyzer, FindsTheTempoOfClicks) {
   const std::vector<uint8_t> pcm = Clicks(20, 44100, 1, 0.6);
-  const Run run = Analyze(pcm, static_cast<int32_t>(pcm.size()), 44100, 1);
+  const Outcome run = Analyze(pcm, static_cast<int32_t>(pcm.size()), 44100, 1);
   ASSERT_GT(run.count, 20);
   EXPECT_NE(run.log.find("Estimated BPM = 100\n"), std::string::npos) << run.log;
   for (size_t i = 1; i < run.beats.size(); ++i) {
@@ -134,7 +134,7 @@ TEST(AudioAnalyzer, FailuresAndCancellation) {
   const std::vector<uint8_t> pcm = Clicks(3, 8000, 3, 0.5);
   const int32_t size = static_cast<int32_t>(pcm.size());
 
-  Run run = Analyze(pcm, size, 8000, 0);
+  Outcome run = Analyze(pcm, size, 8000, 0);
   EXPECT_EQ(run.count, -1);
   EXPECT_NE(run.log.find(" Channels are less than one!\n"), std::string::npos);
   EXPECT_TRUE(run.progress.empty());
