@@ -1,0 +1,83 @@
+package com.quilby.norvane.apps.clipweaver.music.detail;
+
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertNotNull;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
+import java.nio.ByteBuffer;
+import org.junit.jupiter.params.ParameterizedTest;
+import org.junit.jupiter.params.provider.CsvSource;
+
+/** Whatever the Java side passes, the analysis returns finite beats or none. */
+class HostileInputTest {
+  private static final DefaultLocalMusicDetailExtractor EXTRACTOR =
+      new DefaultLocalMusicDetailExtractor();
+
+  private static float[] analyse(ByteBuffer pcm, int size, int rate, int channels) {
+    float[] beats = EXTRACTOR.calculateBeatsInSec(pcm, size, rate, channels);
+    assertNotNull(beats);
+    for (int i = 0; i < beats.length; i++) {
+      assertTrue(Float.isFinite(beats[i]) && beats[i] >= 0, "beat " + beats[i]);
+      if (i > 0) assertTrue(beats[i] > beats[i - 1]);
+    }
+    return beats;
+  }
+
+  @ParameterizedTest(name = "size {0}, rate {1}, channels {2}")
+  @CsvSource({
+    "-1, 44100, 2",
+    "0, 44100, 2",
+    "2147483647, 44100, 2",
+    "-2147483648, 44100, 1",
+    "3, 44100, 2",
+    "2, 44100, 1",
+    "400000, 0, 1",
+    "400000, -44100, 1",
+    "400000, 1, 1",
+    "400000, 1000000000, 1",
+    "400000, 44100, -1",
+    "400000, 44100, 1000000000",
+    "400000, 44100, 2147483647",
+    "400001, 8000, 3",
+  })
+  void sizesRatesAndChannelCounts(int size, int rate, int channels) {
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(400000 / 2 / 44100.0, 44100, 1, 120));
+    float[] beats = analyse(pcm, size, rate, channels);
+    if (size <= 2 || rate <= 1 || channels < 1 || channels > 4) assertEquals(0, beats.length);
+  }
+
+  // A steady signal has no onsets; only its start, where the detector's
+  // history is still empty, may stand out as a single beat at 0.
+  @ParameterizedTest(name = "{0}")
+  @CsvSource({"zeros", "maximum", "minimum", "alternating", "dc"})
+  void steadySignalsGiveAtMostTheStartingBeat(String kind) {
+    short[] pcm = new short[44100 * 4];
+    for (int i = 0; i < pcm.length; i++) {
+      switch (kind) {
+        case "maximum": pcm[i] = Short.MAX_VALUE; break;
+        case "minimum": pcm[i] = Short.MIN_VALUE; break;
+        case "alternating": pcm[i] = i % 2 == 0 ? Short.MAX_VALUE : Short.MIN_VALUE; break;
+        case "dc": pcm[i] = 1234; break;
+        default: break;
+      }
+    }
+    ByteBuffer buffer = TestTracks.direct(pcm);
+    float[] beats = analyse(buffer, buffer.capacity(), 44100, 1);
+    assertTrue(beats.length == 0 || (beats.length == 1 && beats[0] == 0.0f));
+    if (kind.equals("zeros")) assertEquals(0, beats.length);
+  }
+
+  @ParameterizedTest(name = "{0} bytes")
+  @CsvSource({"2", "4", "3528", "3530"})
+  void tinyInputs(int bytes) {
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(1, 44100, 1, 120));
+    analyse(pcm, bytes, 44100, 1);
+  }
+
+  @ParameterizedTest(name = "capacity {0}")
+  @CsvSource({"0", "1", "1000"})
+  void sizesBeyondTheBufferAreClamped(int capacity) {
+    ByteBuffer pcm = ByteBuffer.allocateDirect(capacity);
+    assertEquals(0, analyse(pcm, 1 << 30, 44100, 1).length);
+  }
+}
