@@ -1,0 +1,484 @@
+#include "jni/apm/apm.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdlib>
+
+#include "base/logging.h"
+
+namespace apm {
+namespace {
+
+// Beam tables hold states in 16 bits; this value stands for "no
+// predecessor", so a model may have at most this many states.
+constexpr uint16_t kNoPredecessor = 0xFFFF;
+
+// The tracking pass takes frames modulo every lag, reads the second and
+// third lag for the grid step and takes beam_width states out of every
+// frame; the beam tables need states that fit in 16 bits.
+bool UsableModel(const ApmConfig& config, double min_lag, double max_lag) {
+  double states = 0.0;
+  if (min_lag >= 1.0 && max_lag >= min_lag && max_lag <= kNoPredecessor) {
+    states = (min_lag + max_lag) * (max_lag - min_lag + 1.0) / 2.0;
+  }
+  const bool usable =
+      min_lag >= 1.0 && max_lag - min_lag >= 2.0 &&
+      states <= kNoPredecessor && config.beam_width >= 1 &&
+      states >= config.beam_width && config.phase_table_size >= 1 &&
+      config.period_table_size >= 1 && config.value_slot_count >= 1 &&
+      config.max_apmtime_count >= 1;
+  if (!usable) {
+    LOG(ERROR) << "Unusable tempo model (minlag " << min_lag << ", maxlag "
+               << max_lag << ", " << states << " states, beam width "
+               << config.beam_width << "): no beats to track.";
+  }
+  return usable;
+}
+
+}  // namespace
+
+Apm::Apm(const ApmConfig& config, const std::vector<float>& detection_function,
+         int32_t frames_per_second)
+    : config_(config) {
+  ready_ = TrimInput(detection_function, frames_per_second) && SetUpStates();
+}
+
+// Cuts the frames below the threshold at both ends, then scales the rest to
+// a maximum of 1 and applies the exponent.
+bool Apm::TrimInput(const std::vector<float>& input,
+                    int32_t frames_per_second) {
+  const int32_t n = static_cast<int32_t>(input.size());
+  // Compared in double, so the float nearest the threshold may reach it.
+  const auto reaches = [this](float v) {
+    return static_cast<double>(v) >= config_.trim_threshold;
+  };
+  int32_t start = 0;
+  while (start < n && !reaches(input[start])) ++start;
+  int32_t end = n;
+  while (end > 0 && !reaches(input[end - 1])) --end;
+  if (start >= end) {
+    LOG(ERROR) << "Unable to trim detection function.";
+    start = 0;
+    end = n;
+  }
+  leading_trimmed_ = start;
+  trailing_trimmed_ = n - end;
+  frames_per_second_ = frames_per_second;
+  detection_.assign(input.begin() + start, input.begin() + end);
+
+  LOG(INFO) << "Input trimmed " << leading_trimmed_ << " leading points and "
+            << trailing_trimmed_ << " trailing points to size "
+            << detection_.size() << " in msec "
+            << static_cast<float>(detection_.size() * 1000) / frames_per_second;
+
+  float largest = 0.0f;
+  bool finite = true;
+  for (float v : detection_) {
+    finite = finite && std::isfinite(v);
+    largest = std::max(largest, v);
+  }
+  if (!finite || !(largest > 0.0f)) {
+    LOG(ERROR) << "Detection function has no positive finite maximum: "
+                  "no beats to track.";
+    return false;
+  }
+  const float scale = 1.0f / largest;
+  const float exponent = static_cast<float>(config_.detection_exponent);
+  for (float& v : detection_) v = std::pow(v * scale, exponent);
+  return true;
+}
+
+bool Apm::SetUpStates() {
+  const double rate = frames_per_second_;
+  // Periods in whole frames, halves rounded away from zero.
+  const double min_lag = std::round(config_.min_period_ms * (0.001 * rate));
+  const double max_lag = std::round(config_.max_period_ms * (0.001 * rate));
+  if (!UsableModel(config_, min_lag, max_lag)) return false;
+  min_lag_ = static_cast<int32_t>(min_lag);
+  max_lag_ = static_cast<int32_t>(max_lag);
+  lag_count_ = max_lag_ + 1 - min_lag_;
+  time_count_ = static_cast<int32_t>(detection_.size());
+  value_count_ = std::min(time_count_ + 1, config_.value_slot_count);
+
+  lag_frames_.resize(lag_count_);
+  lag_ms_.resize(lag_count_);
+  for (int32_t i = 0; i < lag_count_; ++i) {
+    lag_frames_[i] = min_lag_ + i;
+    lag_ms_[i] = lag_frames_[i] * 1000.0 / rate;
+  }
+  const double delta_pd_ms = lag_ms_[2] - lag_ms_[1];
+
+  const double sigma = config_.transition_sigma_ms;
+  const auto gaussian = [delta_pd_ms, sigma](int32_t d) {
+    const double x = d * delta_pd_ms;
+    return std::exp(x * x / (sigma * (sigma * -2.0)));
+  };
+  phase_deviation_score_.resize(config_.phase_table_size);
+  for (int32_t d = 0; d < config_.phase_table_size; ++d) {
+    phase_deviation_score_[d] =
+        std::log(config_.phase_deviation_weight * gaussian(d) + kEpsilon);
+  }
+  period_change_score_.resize(config_.period_table_size);
+  for (int32_t d = 0; d < config_.period_table_size; ++d) {
+    period_change_score_[d] =
+        std::log(config_.period_change_weight * gaussian(d) + kEpsilon);
+  }
+
+  // A Gaussian in the decimal logarithm of the period.
+  tempo_prior_.assign(lag_count_, 0.0);
+  for (int32_t i = 0; config_.use_tempo_prior && i < lag_count_; ++i) {
+    const double z = std::log10(lag_frames_[i] * 1000.0 /
+                                (config_.tempo_prior_center_ms * rate)) *
+                     (1.0 / config_.tempo_prior_width);
+    tempo_prior_[i] = config_.tempo_prior_weight *
+                      std::log(kEpsilon + std::exp(z * (z * -0.5)));
+  }
+
+  lag_first_state_.resize(lag_count_);
+  state_lag_.clear();
+  state_phase_.clear();
+  for (int32_t i = 0; i < lag_count_; ++i) {
+    lag_first_state_[i] = static_cast<int32_t>(state_lag_.size());
+    for (int32_t phase = 0; phase < lag_frames_[i]; ++phase) {
+      state_lag_.push_back(lag_frames_[i]);
+      state_phase_.push_back(phase);
+    }
+  }
+  state_count_ = static_cast<int32_t>(state_lag_.size());
+  apmtime_count_ = std::min(time_count_, config_.max_apmtime_count);
+
+  for (int32_t i = 0; i < lag_count_; ++i) {
+    LOG(INFO) << "Lag " << i << " msec:" << lag_ms_[i]
+              << " bpm:" << 60000.0 / lag_ms_[i];
+  }
+  LOG(INFO) << "delta_pd_ms " << delta_pd_ms;
+  LOG(INFO) << "minlag " << min_lag_;
+  LOG(INFO) << "maxlag " << max_lag_;
+  LOG(INFO) << "lag count " << lag_count_;
+  LOG(INFO) << "time count " << time_count_;
+  LOG(INFO) << "state count " << state_count_;
+  LOG(INFO) << "value count " << value_count_;
+  LOG(INFO) << "apmtime count " << apmtime_count_;
+
+  values_.Reset(value_count_, state_count_, kImpossible);
+  observation_.assign(state_count_, kImpossible);
+  comb_rows_ = apmtime_count_ > max_lag_ ? max_lag_ + 1 : apmtime_count_;
+  comb_.Reset(comb_rows_, lag_count_, kImpossible);
+  beam_predecessors_.Reset(time_count_ + 1, config_.beam_width, 0);
+  beam_states_.Reset(time_count_ + 1, config_.beam_width, 0);
+  predecessor_.assign(state_count_, -1);
+  path_.assign(time_count_, 0);
+  // The first frame extends the phase-0 state of every lag.
+  beam_.assign(std::max(config_.beam_width, lag_count_), 0);
+  std::copy(lag_first_state_.begin(), lag_first_state_.end(), beam_.begin());
+
+  on_beat_.assign(lag_count_, 0);
+  live_stamp_.assign(state_count_, -1);
+  candidates_.reserve(state_count_);
+  candidate_lag_.assign(state_count_, 0);
+  candidate_offset_.assign(state_count_, 0);
+  candidate_observation_.assign(state_count_, 0.0);
+  candidate_prior_.assign(state_count_, 0.0);
+  return true;
+}
+
+// Comb filter of every lag: the product of detection values one period
+// apart, mixed with the filter's own output one period earlier.
+void Apm::Observe(int32_t t) {
+  const double weight = config_.comb_input_weight;
+  const float x = detection_[t];
+  double* out = comb_.row(t % comb_rows_);
+  for (int32_t i = 0; i < lag_count_; ++i) {
+    const int32_t back = t - lag_frames_[i];
+    float product = back >= 0
+                        ? detection_[back] * x
+                        : static_cast<float>(config_.comb_start_factor * x);
+    if (weight < 1.0) {
+      const float previous = static_cast<float>(
+          back >= 0 ? std::exp(comb_.row(back % comb_rows_)[i])
+                    : config_.comb_start_factor);
+      product =
+          static_cast<float>(previous * (1.0 - weight) + weight * product);
+    }
+    out[i] = std::log(product + kEpsilon);
+  }
+}
+
+void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
+  for (int32_t i = 0; i < lag_count_; ++i) {
+    on_beat_[i] = lag_first_state_[i] + t % lag_frames_[i];
+  }
+  const double* values = values_.row(cur);
+  for (int32_t k = 0; k < active; ++k) {
+    if (values[beam_[k]] != kImpossible) live_stamp_[beam_[k]] = t;
+  }
+  // On-beat states, and states whose best predecessor has left the beam.
+  // Nothing has a predecessor before the first frame.
+  candidates_.clear();
+  size_t beat = 0;
+  for (int32_t s = 0; s < state_count_; ++s) {
+    if (beat < on_beat_.size() && on_beat_[beat] == s) {
+      candidates_.push_back(s);
+      ++beat;
+    } else if (predecessor_[s] != -1 && live_stamp_[predecessor_[s]] != t) {
+      candidates_.push_back(s);
+    }
+  }
+
+  double* next_values = values_.row(next);
+  if (next != cur) std::copy_n(values, state_count_, next_values);
+  for (int32_t c : candidates_) next_values[c] = kImpossible;
+  const double* comb = comb_.row(t % comb_rows_);
+  for (int32_t i = 0; i < lag_count_; ++i) observation_[on_beat_[i]] = comb[i];
+}
+
+// Re-scores every candidate from every beam entry. The per-candidate and
+// per-entry terms are looked up once; the sum keeps its grouping.
+void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
+  const int32_t count = static_cast<int32_t>(candidates_.size());
+  for (int32_t j = 0; j < count; ++j) {
+    const int32_t c = candidates_[j];
+    candidate_lag_[j] = state_lag_[c];
+    candidate_offset_[j] = WrappedOffset(t, state_lag_[c], state_phase_[c]);
+    candidate_observation_[j] = observation_[c];
+    candidate_prior_[j] = tempo_prior_[state_lag_[c] - min_lag_];
+  }
+  const int32_t last_period = config_.period_table_size - 1;
+  const int32_t last_phase = config_.phase_table_size - 1;
+  // Rows cur and next are one when the ring has a single row; entries read
+  // later then see this frame's updates.
+  const double* values = values_.row(cur);
+  double* next_values = values_.row(next);
+  for (int32_t k = 0; k < active; ++k) {
+    const int32_t f = beam_[k];
+    const double base =
+        config_.beat_bonus + (values[f] == kImpossible ? 0.0 : values[f]);
+    const int32_t lag = state_lag_[f];
+    const int32_t offset = WrappedOffset(t, lag, state_phase_[f]);
+    for (int32_t j = 0; j < count; ++j) {
+      const double period = period_change_score_[std::min(
+          std::abs(candidate_lag_[j] - lag), last_period)];
+      const double phase = phase_deviation_score_[std::min(
+          std::abs(offset - candidate_offset_[j]), last_phase)];
+      const double score =
+          base + (((candidate_observation_[j] + period) + phase) +
+                  candidate_prior_[j]);
+      const int32_t c = candidates_[j];
+      if (score > next_values[c]) {
+        next_values[c] = score;
+        predecessor_[c] = f;
+      }
+    }
+  }
+}
+
+void Apm::Run(std::function<bool(float)> progress) {
+  if (!ready_) return;
+  int32_t active = lag_count_;
+  for (int32_t t = 0; t < time_count_; ++t) {
+    if (t % 500 == 0) {
+      LOG(INFO) << "Timestep " << t << " "
+                << static_cast<float>(t) / frames_per_second_ << " sec";
+      if (progress && progress(static_cast<float>(t) / time_count_)) return;
+    }
+    const int32_t cur = t % value_count_;
+    const int32_t next = (t + 1) % value_count_;
+    Observe(t);
+    PrepareStep(t, cur, next, active);
+    Transition(t, cur, next, active);
+    SelectBeam(t, next);
+    active = config_.beam_width;
+  }
+  Backtrack();
+  PlaceBeats();
+}
+
+void Apm::SelectBeam(int32_t t, int32_t next) {
+  selector_.Select(values_.row(next), state_count_, config_.beam_width,
+                   beam_.data());
+  uint16_t* states = beam_states_.row(t + 1);
+  uint16_t* predecessors = beam_predecessors_.row(t + 1);
+  for (int32_t k = 0; k < config_.beam_width; ++k) {
+    const int32_t s = beam_[k];
+    states[k] = static_cast<uint16_t>(s);
+    predecessors[k] = predecessor_[s] == -1
+                          ? kNoPredecessor
+                          : static_cast<uint16_t>(predecessor_[s]);
+  }
+}
+
+void BeamSelector::Select(const double* values, int32_t count,
+                          int32_t width, int32_t* beam) {
+  // Spare ranks below the beam, so that the next row usually still has
+  // more than width values at or above the floor.
+  constexpr size_t kSpare = 16;
+  above_.clear();
+  for (int32_t s = 0; s < count; ++s) {
+    if (!has_floor_ || values[s] >= floor_) above_.push_back({s, values[s]});
+  }
+  const auto larger = [](const BeamEntry& a, const BeamEntry& b) {
+    return a.value > b.value;
+  };
+  // Only a value below the beam shows that the beam's values are above all
+  // the others.
+  bool distinct = above_.size() > static_cast<size_t>(width);
+  const auto first_out = above_.begin() + (distinct ? width : 0);
+  if (distinct) {
+    std::nth_element(above_.begin(), first_out, above_.end(), larger);
+    std::sort(above_.begin(), first_out, larger);
+    for (auto it = above_.begin(); distinct && it != first_out; ++it) {
+      distinct = it->value > (it + 1)->value;
+    }
+  }
+  has_floor_ = distinct;
+  if (!distinct) {
+    SelectByHeap(values, count, width, beam);
+    return;
+  }
+  // The heap keeps exactly these and pops them in ascending order.
+  for (int32_t k = 0; k < width; ++k) beam[k] = above_[width - 1 - k].state;
+  const size_t spare = std::min(above_.size() - 1 - width, kSpare);
+  std::nth_element(first_out, first_out + spare, above_.end(), larger);
+  floor_ = first_out[spare].value;
+}
+
+void BeamSelector::SelectByHeap(const double* values, int32_t count,
+                                int32_t width, int32_t* beam) {
+  heap_.clear();
+  for (int32_t s = 0; s < count; ++s) {
+    if (static_cast<int32_t>(heap_.size()) < width) {
+      Push(s, values[s]);
+    } else if (!(heap_[0].value >= values[s])) {
+      Pop();
+      Push(s, values[s]);
+    }
+  }
+  for (int32_t k = 0; k < width; ++k) beam[k] = Pop().state;
+}
+
+void BeamSelector::Push(int32_t state, double value) {
+  size_t i = heap_.size();
+  heap_.push_back({state, value});
+  while (i > 0 && !(value >= heap_[(i - 1) / 2].value)) {
+    heap_[i] = heap_[(i - 1) / 2];
+    i = (i - 1) / 2;
+  }
+  heap_[i] = {state, value};
+}
+
+BeamEntry BeamSelector::Pop() {
+  const BeamEntry root = heap_[0];
+  const BeamEntry sifted = heap_.back();
+  const size_t size = heap_.size() - 1;
+  size_t i = 0;
+  for (size_t child = 1; child < size; child = 2 * i + 1) {
+    if (child + 1 < size && !(heap_[child + 1].value >= heap_[child].value)) {
+      ++child;
+    }
+    if (!(sifted.value >= heap_[child].value)) break;
+    heap_[i] = heap_[child];
+    i = child;
+  }
+  heap_[i] = sifted;
+  heap_.pop_back();
+  return root;
+}
+
+// Row t of the beam tables holds the beam after frame t - 1, so it names
+// the predecessor of the path's state at that frame.
+void Apm::Backtrack() {
+  int32_t s = BestFinalState();
+  const int32_t width = config_.beam_width;
+  for (int32_t t = time_count_; t >= 1; --t) {
+    const uint16_t* states = beam_states_.row(t);
+    int32_t k = 0;
+    while (k < width && states[k] != s) ++k;
+    if (k == width) {
+      LOG(ERROR) << "Broken state link " << t << " of " << time_count_;
+      // Go on from the best state of the beam, which was popped last.
+      k = width - 1;
+      if (s == -1) s = states[k];
+    }
+    path_[t - 1] = s;
+    const uint16_t predecessor = beam_predecessors_.row(t)[k];
+    s = predecessor == kNoPredecessor ? -1 : predecessor;
+  }
+}
+
+// The first state with the largest value after the last frame.
+int32_t Apm::BestFinalState() const {
+  const double* last = values_.row(time_count_ % value_count_);
+  int32_t state = 0;
+  double best = -10000000.0;
+  for (int32_t s = 0; s < state_count_; ++s) {
+    if (last[s] > best) {
+      best = last[s];
+      state = s;
+    }
+  }
+  return state;
+}
+
+void Apm::PlaceBeats() {
+  beat_times_ =
+      BeatFramesToSeconds(PlaceBeatFrames(path_, state_lag_, state_phase_,
+                                          config_.min_beat_spacing),
+                          leading_trimmed_, frames_per_second_);
+  bpm_ = MedianTempo(beat_times_);
+}
+
+int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase) {
+  const int32_t half = lag / 2;
+  int32_t x = t % lag - phase;
+  if (x <= -half) x += lag;
+  if (x > half) x -= lag;
+  return x;
+}
+
+std::vector<int32_t> PlaceBeatFrames(const std::vector<int32_t>& path,
+                                     const std::vector<int32_t>& state_lag,
+                                     const std::vector<int32_t>& state_phase,
+                                     double min_beat_spacing) {
+  std::vector<int32_t> frames;
+  int32_t last = -1000000;
+  int32_t previous_lag = -1;
+  int32_t previous_phase = -1;
+  for (int32_t t = 0; t < static_cast<int32_t>(path.size()); ++t) {
+    const int32_t lag = state_lag[path[t]];
+    const int32_t phase = state_phase[path[t]];
+    const bool changed = lag != previous_lag || phase != previous_phase;
+    if (static_cast<double>(t - last) > min_beat_spacing * lag &&
+        (t % lag == phase || changed)) {
+      frames.push_back(t);
+      last = t;
+    }
+    previous_lag = lag;
+    previous_phase = phase;
+  }
+  return frames;
+}
+
+std::vector<double> BeatFramesToSeconds(const std::vector<int32_t>& frames,
+                                        int32_t leading_trimmed,
+                                        int32_t frames_per_second) {
+  const double seconds_per_frame = 1.0 / frames_per_second;
+  std::vector<double> times(frames.size());
+  for (size_t i = 0; i < frames.size(); ++i) {
+    times[i] =
+        (static_cast<double>(frames[i]) + leading_trimmed) * seconds_per_frame;
+  }
+  return times;
+}
+
+double MedianTempo(const std::vector<double>& beat_times) {
+  if (beat_times.size() < 2) return 0.0;
+  std::vector<double> intervals(beat_times.size() - 1);
+  for (size_t i = 0; i < intervals.size(); ++i) {
+    intervals[i] = beat_times[i + 1] - beat_times[i];
+  }
+  const auto middle = intervals.begin() + (beat_times.size() - 1) / 2;
+  std::nth_element(intervals.begin(), middle, intervals.end());
+  return 60.0 / *middle;
+}
+
+}  // namespace apm

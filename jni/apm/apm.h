@@ -1,0 +1,228 @@
+// Tempo and beat tracker. The music is modelled as a hidden sequence of
+// (period, phase) states: a period ("lag") is a beat interval in frames, the
+// phase says at which frames modulo the period the beats fall. Comb filters
+// measure how strongly the detection function repeats at every period, a
+// beam-limited Viterbi pass scores state sequences frame by frame, and the
+// best path is backtracked. Beats go where the best state is on its beat or
+// changes; the tempo is 60 over the median beat interval.
+#ifndef CLIPWEAVER_JNI_APM_APM_H_
+#define CLIPWEAVER_JNI_APM_APM_H_
+
+#include <cstdint>
+#include <functional>
+#include <vector>
+
+namespace apm {
+
+struct ApmConfig {
+  int32_t beam_width = 100;
+  int32_t phase_table_size = 100;
+  int32_t period_table_size = 100;
+  // At 1.0 or more the comb filters have no feedback.
+  double comb_input_weight = 0.8;
+  double tempo_prior_center_ms = 500.0;
+  // Standard deviation in decades of the period.
+  double tempo_prior_width = 0.2;
+  double tempo_prior_weight = 2.0;
+  bool use_tempo_prior = true;
+  double min_period_ms = 50.0;
+  double max_period_ms = 800.0;
+  double transition_sigma_ms = 5.0;
+  double period_change_weight = 0.5;
+  double phase_deviation_weight = 0.9;
+  int32_t max_apmtime_count = 2000;
+  int32_t value_slot_count = 3;
+  double detection_exponent = 0.5;
+  double trim_threshold = 0.05;
+  // Stands in for the detection value and comb output one period before
+  // the start.
+  double comb_start_factor = 0.1;
+  // Least distance between two beats, as a fraction of the current period.
+  double min_beat_spacing = 0.75;
+  double beat_bonus = 2.0;
+};
+
+// Signed distance in frames from frame t to the nearest beat of a state with
+// the given lag and phase, positive after the beat.
+int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase);
+
+struct BeamEntry {
+  int32_t state;
+  double value;
+};
+
+// Writes to beam[0..width) the indices of the width largest of
+// values[0..count), smallest first, exactly as a binary min-heap fed in
+// index order leaves them: once the heap is full a larger value replaces
+// the root, and equal values come out in the order its push and pop give
+// them. Needs count >= width and no NaN.
+class BeamSelector {
+ public:
+  void Select(const double* values, int32_t count, int32_t width,
+              int32_t* beam);
+  // The heap itself. Select takes a shortcut, with the same result, when
+  // the width largest values are distinct and above all the others.
+  void SelectByHeap(const double* values, int32_t count, int32_t width,
+                    int32_t* beam);
+
+ private:
+  // A binary heap with the smallest value at the root. Push sifts up past
+  // every larger parent; Pop moves the last entry to the root and sifts it
+  // down past every child it is at least equal to.
+  void Push(int32_t state, double value);
+  BeamEntry Pop();
+
+  std::vector<BeamEntry> heap_;
+  std::vector<BeamEntry> above_;
+  // Rows change little from frame to frame, so the last row's ranking
+  // tells which values can matter in the next.
+  double floor_ = 0.0;
+  bool has_floor_ = false;
+};
+
+// Frames of a best-state path (path[t] indexes state_lag and state_phase)
+// that get a beat: where the state is on its beat or differs from the
+// frame before, and more than min_beat_spacing periods after the last beat.
+std::vector<int32_t> PlaceBeatFrames(const std::vector<int32_t>& path,
+                                     const std::vector<int32_t>& state_lag,
+                                     const std::vector<int32_t>& state_phase,
+                                     double min_beat_spacing);
+
+// Seconds from the start of the untrimmed detection function.
+std::vector<double> BeatFramesToSeconds(const std::vector<int32_t>& frames,
+                                        int32_t leading_trimmed,
+                                        int32_t frames_per_second);
+
+// 60 over the median beat interval (the upper middle one for an even
+// count); 0 when there are fewer than two beats.
+double MedianTempo(const std::vector<double>& beat_times);
+
+class Apm {
+ public:
+  // Trims and shapes the detection function and builds the model. A
+  // function with nothing to normalise or a set-up the tracker cannot run
+  // is logged; Run then finds no beats.
+  Apm(const ApmConfig& config, const std::vector<float>& detection_function,
+      int32_t frames_per_second);
+  Apm(const Apm&) = delete;
+  Apm& operator=(const Apm&) = delete;
+
+  // progress gets the fraction of frames done before frames 0, 500, 1000,
+  // ...; true cancels, leaving no beats.
+  void Run(std::function<bool(float)> progress);
+
+  std::vector<double> beat_times() const { return beat_times_; }
+  double bpm() const { return bpm_; }
+
+  // The model, for inspection.
+  int32_t leading_trimmed() const { return leading_trimmed_; }
+  int32_t trailing_trimmed() const { return trailing_trimmed_; }
+  const std::vector<float>& detection() const { return detection_; }
+  int32_t min_lag() const { return min_lag_; }
+  int32_t max_lag() const { return max_lag_; }
+  int32_t lag_count() const { return lag_count_; }
+  int32_t time_count() const { return time_count_; }
+  int32_t state_count() const { return state_count_; }
+  int32_t value_count() const { return value_count_; }
+  int32_t apmtime_count() const { return apmtime_count_; }
+  const std::vector<double>& lag_ms() const { return lag_ms_; }
+  const std::vector<int32_t>& lag_first_state() const {
+    return lag_first_state_;
+  }
+  const std::vector<int32_t>& state_lag() const { return state_lag_; }
+  const std::vector<int32_t>& state_phase() const { return state_phase_; }
+  const std::vector<double>& tempo_prior() const { return tempo_prior_; }
+  const std::vector<double>& phase_deviation_score() const {
+    return phase_deviation_score_;
+  }
+  const std::vector<double>& period_change_score() const {
+    return period_change_score_;
+  }
+  const std::vector<int32_t>& path() const { return path_; }
+
+ private:
+  // Row-major 2-D array.
+  template <typename T>
+  struct Table {
+    void Reset(int32_t row_count, int32_t column_count, T fill) {
+      columns = column_count;
+      cells.assign(static_cast<size_t>(row_count) * column_count, fill);
+    }
+    T* row(int32_t r) {
+      return cells.data() + static_cast<size_t>(r) * columns;
+    }
+    const T* row(int32_t r) const {
+      return cells.data() + static_cast<size_t>(r) * columns;
+    }
+    int32_t columns = 0;
+    std::vector<T> cells;
+  };
+
+  bool TrimInput(const std::vector<float>& input, int32_t frames_per_second);
+  bool SetUpStates();
+  void Observe(int32_t t);
+  void PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active);
+  void Transition(int32_t t, int32_t cur, int32_t next, int32_t active);
+  void SelectBeam(int32_t t, int32_t next);
+  void Backtrack();
+  int32_t BestFinalState() const;
+  void PlaceBeats();
+
+  int32_t leading_trimmed_ = 0;
+  int32_t trailing_trimmed_ = 0;
+  int32_t lag_count_ = 0;
+  int32_t time_count_ = 0;
+  int32_t state_count_ = 0;
+  int32_t value_count_ = 0;
+  int32_t apmtime_count_ = 0;
+  int32_t min_lag_ = 0;
+  int32_t max_lag_ = 0;
+  // Ascending.
+  std::vector<int32_t> candidates_;
+  static constexpr double kImpossible = -100000.0;
+  static constexpr double kEpsilon = 1e-5;
+  int32_t frames_per_second_ = 0;
+  std::vector<float> detection_;
+
+  // Only frame t - lag is ever read back, so the ring is no deeper than
+  // the longest lag needs.
+  Table<double> comb_;
+  int32_t comb_rows_ = 0;
+  // Ring of value_count_ rows.
+  Table<double> values_;
+  // Beam tables grow with the input, so states are kept in 16 bits.
+  Table<uint16_t> beam_predecessors_;
+  std::vector<int32_t> predecessor_;
+  std::vector<double> observation_;
+  Table<uint16_t> beam_states_;
+  std::vector<int32_t> path_;
+  std::vector<int32_t> beam_;
+
+  std::vector<int32_t> lag_first_state_;
+  std::vector<int32_t> lag_frames_;
+  std::vector<double> lag_ms_;
+  std::vector<int32_t> state_phase_;
+  std::vector<int32_t> state_lag_;
+  std::vector<double> tempo_prior_;
+  std::vector<double> phase_deviation_score_;
+  std::vector<double> period_change_score_;
+  std::vector<double> beat_times_;
+  double bpm_ = 0.0;
+  ApmConfig config_;
+
+  // False when the input or the set-up leaves nothing to track.
+  bool ready_ = false;
+
+  // Per-frame scratch, sized once.
+  std::vector<int32_t> on_beat_;
+  std::vector<int32_t> live_stamp_;
+  std::vector<int32_t> candidate_lag_;
+  std::vector<int32_t> candidate_offset_;
+  std::vector<double> candidate_observation_;
+  std::vector<double> candidate_prior_;
+  BeamSelector selector_;
+};
+
+}  // namespace apm
+
+#endif  // CLIPWEAVER_JNI_APM_APM_H_
