@@ -66,6 +66,8 @@ bool Spectrogram::Initialize(const std::vector<double>& window,
       2 + static_cast<int32_t>(std::sqrt(static_cast<double>(fft_length_ / 2))),
       0);
   sample_queue_.clear();
+  sample_queue_.reserve(static_cast<size_t>(window_length_) +
+                        std::max(step_length_, window_length_));
   is_initialized_ = true;
   samples_needed_ = window_length_;
   return true;
@@ -115,17 +117,18 @@ bool Spectrogram::TakeNextWindow(const float* input, int32_t input_size,
   sample_queue_.insert(sample_queue_.end(), input + *input_start,
                        input + *input_start + samples_needed_);
   *input_start += samples_needed_;
-  while (static_cast<int32_t>(sample_queue_.size()) > window_length_) {
-    sample_queue_.pop_front();
+  if (static_cast<int32_t>(sample_queue_.size()) > window_length_) {
+    sample_queue_.erase(sample_queue_.begin(),
+                        sample_queue_.end() - window_length_);
   }
   samples_needed_ = step_length_;
   return true;
 }
 
 void Spectrogram::TransformWindow() {
-  auto sample = sample_queue_.begin();
-  for (int32_t j = 0; j < window_length_; ++j, ++sample) {
-    fft_buffer_[j] = window_[j] * *sample;
+  const double* samples = sample_queue_.data();
+  for (int32_t j = 0; j < window_length_; ++j) {
+    fft_buffer_[j] = window_[j] * samples[j];
   }
   for (int32_t j = window_length_; j < fft_length_; ++j) fft_buffer_[j] = 0.0;
   RealFft(fft_length_, 1, fft_buffer_.data(), bit_reversal_work_.data(),

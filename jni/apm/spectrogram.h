@@ -10,7 +10,6 @@
 
 #include <complex>
 #include <cstdint>
-#include <deque>
 #include <functional>
 #include <vector>
 
@@ -63,7 +62,9 @@ class Spectrogram {
   int32_t samples_needed_ = 0;
   std::vector<double> window_;
   std::vector<double> fft_buffer_;
-  std::deque<double> sample_queue_;
+  // The latest samples, oldest first: exactly one window when a frame is
+  // formed. Contiguous, so the window product is one pass over two arrays.
+  std::vector<double> sample_queue_;
   std::vector<int32_t> bit_reversal_work_;
   std::vector<double> twiddle_table_;
 };
