@@ -1,0 +1,91 @@
+"""Tempo and beats of the example groove across formats, rates and output
+formats."""
+import json
+import statistics
+import unittest
+
+from tool_harness import beats_json, example, main, run
+
+
+class TempoAcrossFormats(unittest.TestCase):
+    # At 22,050 Hz the analysis takes 99 frames per second for a hop that
+    # gives 99.77, so tempos there read up to 0.8% low; 110 BPM falls on a
+    # whole number of frames and stays clear of the 1% margin.
+    CASES = [
+        ('w44.wav', 120, 44100, 2),
+        ('f48.flac', 100, 48000, 1),
+        ('w22.wav', 110, 22050, 2),
+        ('o44.ogg', 90, 44100, 2),
+    ]
+
+    def test_tempo_within_one_percent_of_the_groove(self):
+        for name, bpm, rate, channels in self.CASES:
+            with self.subTest(name):
+                [result] = beats_json(example(name, bpm, rate, channels))
+                self.assertEqual(result['sample_rate'], rate)
+                self.assertEqual(result['channels'], channels)
+                self.assertAlmostEqual(result['duration'], 20.0, places=3)
+                self.assertLess(abs(result['tempo'] - bpm) / bpm, 0.01)
+                beats = result['beats']
+                self.assertEqual(beats, sorted(beats))
+                self.assertLessEqual(abs(len(beats) - 20 * bpm / 60), 2)
+                period = 60 / bpm
+                steps = [b - a for a, b in zip(beats, beats[1:])]
+                self.assertLess(abs(statistics.median(steps) - period), 0.02)
+
+    def test_wav_and_flac_of_one_signal_give_the_same_beats(self):
+        [wav] = beats_json(example('same.wav', 100, 48000, 1))
+        [flac] = beats_json(example('same.flac', 100, 48000, 1))
+        self.assertEqual(wav['beats'], flac['beats'])
+        self.assertEqual(wav['tempo'], flac['tempo'])
+
+
+class OutputFormats(unittest.TestCase):
+    def test_json_lines_come_in_argument_order_whatever_the_jobs(self):
+        files = [example('a.wav', 120), example('b.flac', 100, 48000, 1),
+                 example('c.wav', 90, 32000, 1), example('d.wav', 128)]
+        order = [files[3], files[1], files[0], files[2]]
+        serial = run('beats', '--format', 'json', '-j', '1', *order)
+        parallel = run('beats', '--format', 'json', '-j4', *order)
+        self.assertEqual(parallel.returncode, 0, parallel.stderr)
+        self.assertEqual(serial.stdout, parallel.stdout)
+        lines = parallel.stdout.splitlines()
+        self.assertEqual([json.loads(l)['file'] for l in lines], order)
+        self.assertEqual(set(json.loads(lines[0])),
+                         {'file', 'duration', 'sample_rate', 'channels',
+                          'tempo', 'beats'})
+
+    def test_csv_holds_one_row_per_beat(self):
+        groove = example('a.wav', 120)
+        [result] = beats_json(groove)
+        done = run('beats', '--format', 'csv', groove, groove)
+        rows = done.stdout.splitlines()
+        self.assertEqual(rows[0], 'file,tempo_bpm,beat,time_s')
+        self.assertEqual(len(rows), 1 + 2 * len(result['beats']))
+        for i, row in enumerate(rows[1:1 + len(result['beats'])]):
+            file, tempo, number, time = row.split(',')
+            self.assertEqual((file, int(number)), (groove, i + 1))
+            self.assertAlmostEqual(float(tempo), result['tempo'], places=3)
+            self.assertAlmostEqual(float(time), result['beats'][i], places=3)
+
+    def test_text_heads_each_file_with_its_tempo(self):
+        groove = example('a.wav', 120)
+        done = run('beats', groove)
+        lines = done.stdout.splitlines()
+        self.assertEqual(
+            lines[0],
+            groove + ': 120.00 BPM, 40 beats in 20.00 s (44100 Hz, 2 channels)')
+        times = [float(t) for line in lines[1:] for t in line.split()]
+        self.assertEqual(len(times), 40)
+        self.assertTrue(all(len(line.split()) <= 8 for line in lines[1:]))
+
+    def test_library_log_reaches_stderr_only_when_verbose(self):
+        groove = example('a.wav', 120)
+        self.assertEqual(run('beats', groove).stderr, '')
+        verbose = run('beats', '--verbose', groove).stderr
+        self.assertIn('native : audio_analyzer.cc:', verbose)
+        self.assertIn('Estimated BPM = 120', verbose)
+
+
+if __name__ == '__main__':
+    main()

@@ -1,0 +1,102 @@
+"""What a person at a terminal sees: help, version, the progress bar and
+Ctrl-C."""
+import os
+import pty
+import re
+import signal
+import subprocess
+import unittest
+
+import tool_harness
+from tool_harness import example, main, run
+
+
+class HelpAndVersion(unittest.TestCase):
+    def test_help_lists_every_option_with_examples(self):
+        for args in (('--help',), ('beats', '--help'), ('example', '-h')):
+            with self.subTest(args):
+                done = run(*args)
+                self.assertEqual(done.returncode, 0)
+                for option in ('--format', '--jobs', '--quiet', '--verbose',
+                               '--click', '--plot', '--rate', '--bpm',
+                               '--seconds', '--channels', '--version'):
+                    self.assertIn(option, done.stdout)
+                self.assertIn('\nExamples:\n  clipweaver ', done.stdout)
+
+    def test_version(self):
+        done = run('--version')
+        self.assertEqual(done.returncode, 0)
+        self.assertRegex(done.stdout, r'^clipweaver \d+\.\d+\.\d+\n$')
+
+    def test_example_is_the_same_every_time(self):
+        first, second = example('one.wav', seconds=2), example('two.wav', seconds=2)
+        with open(first, 'rb') as a, open(second, 'rb') as b:
+            self.assertEqual(a.read(), b.read())
+
+
+def run_on_terminal(*args):
+    """Runs the tool with stderr on a pseudo-terminal; returns what the
+    terminal received and the exit status."""
+    controller, terminal = pty.openpty()
+    process = subprocess.Popen([tool_harness.TOOL, *args], stdout=subprocess.DEVNULL,
+                               stderr=terminal, cwd=tool_harness.WORK)
+    os.close(terminal)
+    received = b''
+    while True:
+        try:
+            chunk = os.read(controller, 65536)
+        except OSError:  # the terminal closes with the process
+            break
+        if not chunk:
+            break
+        received += chunk
+    os.close(controller)
+    return received.decode(), process.wait()
+
+
+class ProgressBar(unittest.TestCase):
+    def test_drawn_on_a_terminal_up_to_100_percent_and_erased(self):
+        groove = example('groove.wav')
+        shown, status = run_on_terminal('beats', groove)
+        self.assertEqual(status, 0)
+        percents = [int(p) for p in re.findall(r'\] +(\d+)%', shown)]
+        self.assertEqual(percents[0], 0)
+        self.assertEqual(percents[-1], 100)
+        self.assertEqual(percents, sorted(percents))
+        self.assertIn('groove.wav', shown)
+        self.assertTrue(shown.endswith('\x1b[J'))
+
+    def test_one_row_per_worker(self):
+        files = [example('groove.wav'), example('other.wav', 100)] * 2
+        shown, status = run_on_terminal('beats', '-j2', *files)
+        self.assertEqual(status, 0)
+        # Two rows are redrawn together: the cursor goes up two lines.
+        self.assertIn('\x1b[2A', shown)
+        self.assertNotIn('\x1b[3A', shown)
+
+    def test_quiet_and_verbose_draw_none(self):
+        groove = example('groove.wav')
+        self.assertEqual(run_on_terminal('beats', '--quiet', groove), ('', 0))
+        shown, _ = run_on_terminal('beats', '--verbose', groove)
+        self.assertNotIn('%', shown)
+        self.assertIn('native : ', shown)
+
+
+class Interrupt(unittest.TestCase):
+    def test_ctrl_c_prints_what_finished_and_exits_with_130(self):
+        short = example('groove.wav')
+        long = example('ten-minutes.wav', seconds=600)
+        process = subprocess.Popen(
+            [tool_harness.TOOL, 'beats', '-j1', short, long, short],
+            stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True)
+        first = process.stdout.readline()
+        process.send_signal(signal.SIGINT)
+        rest, errors = process.communicate(timeout=60)
+        self.assertEqual(process.returncode, 130)
+        self.assertTrue(first.startswith(short + ': 120.00 BPM'))
+        self.assertNotIn(long, rest)
+        self.assertEqual(errors, 'clipweaver: interrupted\n')
+
+
+if __name__ == '__main__':
+    main()

@@ -1,0 +1,92 @@
+#include "tools/beats_command.h"
+
+#include <fcntl.h>
+#include <unistd.h>
+
+#include <algorithm>
+#include <thread>
+#include <vector>
+
+#include "tools/beat_analysis.h"
+#include "tools/console.h"
+#include "tools/interrupt.h"
+#include "tools/ordered_batch.h"
+#include "tools/report.h"
+#include "tools/stderr_silencer.h"
+
+namespace cwtool {
+namespace {
+
+std::string BaseName(const std::string& path) {
+  return path.substr(path.find_last_of('/') + 1);
+}
+
+ExtraOutputs ExtrasFor(const BeatsOptions& options, const std::string& file) {
+  ExtraOutputs extras;
+  if (!options.click_pattern.empty()) {
+    extras.click_path = OutputName(options.click_pattern, file);
+  }
+  if (!options.plot_pattern.empty()) {
+    extras.plot_path = OutputName(options.plot_pattern, file);
+  }
+  return extras;
+}
+
+}  // namespace
+
+int RunBeats(const BeatsOptions& options) {
+  const size_t count = options.files.size();
+  const int cores = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
+  const int workers = static_cast<int>(
+      std::min<size_t>(count, static_cast<size_t>(options.jobs > 0 ? options.jobs : cores)));
+
+  // The tool's own messages keep the real stderr; the library's lines go to
+  // /dev/null unless asked for.
+  const int err_fd = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, 0);
+  const bool bars = !options.quiet && !options.verbose && isatty(err_fd);
+  StderrSilencer silencer(!options.verbose);
+  InstallInterruptHandler();
+  const std::atomic<bool>& interrupted = InterruptFlag();
+
+  int failures = 0;
+  {
+    Console console(err_fd, bars ? workers : 0);
+    const Report report(options.format);
+    std::vector<BeatResult> results(count);
+    OrderedBatch batch(count, workers, [&](size_t index, int worker) {
+      const std::string& file = options.files[index];
+      const std::string label = BaseName(file);
+      console.Progress(worker, label, 0);
+      results[index] = AnalyseFile(
+          file, ExtrasFor(options, file),
+          [&](int percent) { console.Progress(worker, label, percent); });
+      console.ProgressIdle(worker);
+    });
+
+    console.Result(report.Header());
+    for (size_t i = 0; i < count; ++i) {
+      batch.WaitFor(i);
+      BeatResult& r = results[i];
+      if (r.interrupted) continue;
+      if (!r.error.empty()) {
+        ++failures;
+        console.Message("clipweaver: " + r.path + ": " + r.error);
+        console.Result(report.Failure(r.path, r.error));
+      } else {
+        console.Result(report.Result(r));
+        if (!r.output_error.empty()) {
+          ++failures;
+          console.Message("clipweaver: " + r.path + ": " + r.output_error);
+        }
+      }
+      r = BeatResult{};  // printed: its memory can go
+    }
+    if (interrupted.load()) console.Message("clipweaver: interrupted");
+    // Leaving the scope joins the workers before the console goes.
+  }
+  close(err_fd);
+  if (interrupted.load()) return 130;
+  return failures > 0 ? 1 : 0;
+}
+
+}  // namespace cwtool

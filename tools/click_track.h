@@ -1,0 +1,19 @@
+// The input with a short click on every beat, to check the beats by ear.
+#ifndef CLIPWEAVER_TOOLS_CLICK_TRACK_H_
+#define CLIPWEAVER_TOOLS_CLICK_TRACK_H_
+
+#include <string>
+#include <vector>
+
+#include "tools/audio_file.h"
+
+namespace cwtool {
+
+// Same rate and channels as the input; the container follows the
+// extension of path.
+bool WriteClickTrack(const std::string& path, const DecodedAudio& audio,
+                     const std::vector<float>& beats, std::string* error);
+
+}  // namespace cwtool
+
+#endif  // CLIPWEAVER_TOOLS_CLICK_TRACK_H_

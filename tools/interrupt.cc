@@ -1,0 +1,27 @@
+#include "tools/interrupt.h"
+
+#include <signal.h>
+
+namespace cwtool {
+namespace {
+
+std::atomic<bool> interrupted{false};
+static_assert(std::atomic<bool>::is_always_lock_free,
+              "the signal handler needs a lock-free flag");
+
+void OnInterrupt(int) { interrupted.store(true); }
+
+}  // namespace
+
+void InstallInterruptHandler() {
+  struct sigaction action {};
+  action.sa_handler = OnInterrupt;
+  sigemptyset(&action.sa_mask);
+  // One-shot: the default action is back for a second Ctrl-C.
+  action.sa_flags = SA_RESETHAND;
+  sigaction(SIGINT, &action, nullptr);
+}
+
+const std::atomic<bool>& InterruptFlag() { return interrupted; }
+
+}  // namespace cwtool
