@@ -8,9 +8,6 @@ import static org.junit.jupiter.api.Assertions.assertTrue;
 import java.nio.ByteBuffer;
 import java.util.ArrayList;
 import java.util.List;
-import java.util.concurrent.ExecutorService;
-import java.util.concurrent.Executors;
-import java.util.concurrent.Future;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
@@ -125,27 +122,6 @@ class DefaultLocalMusicDetailExtractorTest {
     assertTrue(fromMono.length > 10);
     assertArrayEquals(fromMono, fromStereo);
     assertArrayEquals(fromMono, withPartialFrame);
-  }
-
-  @Test
-  void resultsAreTheSameOnEveryThread() throws Exception {
-    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(10, 44100, 1, 128));
-    float[] expected =
-        new DefaultLocalMusicDetailExtractor().calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1);
-    ExecutorService pool = Executors.newFixedThreadPool(4);
-    try {
-      List<Future<float[]>> runs = new ArrayList<>();
-      for (int i = 0; i < 8; i++) {
-        runs.add(
-            pool.submit(
-                () ->
-                    new DefaultLocalMusicDetailExtractor()
-                        .calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1)));
-      }
-      for (Future<float[]> run : runs) assertArrayEquals(expected, run.get());
-    } finally {
-      pool.shutdown();
-    }
   }
 
   @Test
