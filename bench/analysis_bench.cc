@@ -4,34 +4,17 @@
 #include <sys/resource.h>
 
 #include <chrono>
-#include <cmath>
-#include <cstring>
 #include <vector>
 
+#include "bench/pulse_track.h"
 #include "jni/apm/audio_analyzer.h"
 
 namespace {
 
-constexpr int kRate = 44100;
-
-// Kicks every half second over low noise: a steady 120 BPM pulse.
-std::vector<int16_t> Pulse(double seconds, int channels) {
-  const size_t frames = static_cast<size_t>(seconds * kRate);
-  std::vector<int16_t> pcm(frames * channels);
-  uint32_t noise = 12345;
-  for (size_t i = 0; i < frames; ++i) {
-    noise = noise * 1664525u + 1013904223u;
-    const double t = static_cast<double>(i) / kRate;
-    const double since = std::fmod(t, 0.5);
-    const double kick = 16000 * std::exp(-since * 25) * std::sin(2 * M_PI * 70 * since);
-    const int16_t v = static_cast<int16_t>(kick + static_cast<int>(noise >> 22) - 512);
-    for (int c = 0; c < channels; ++c) pcm[i * channels + c] = v;
-  }
-  return pcm;
-}
+constexpr int kRate = kPulseRate;
 
 void BM_SpectrogramAndOnsets60s(benchmark::State& state) {
-  const std::vector<int16_t> pcm = Pulse(60, 1);
+  const std::vector<int16_t> pcm = PulseTrack(60, 1);
   const std::vector<float> mono(pcm.begin(), pcm.end());
   const apm::ProgressCallback none = [](float) { return false; };
   std::vector<apm::SpectrogramFrame> frames;
@@ -56,7 +39,7 @@ BENCHMARK(BM_SpectrogramAndOnsets60s)->Unit(benchmark::kMillisecond);
 // tracker's pass from there to the end.
 void BM_WholeAnalysis180sStereo(benchmark::State& state) {
   using Clock = std::chrono::steady_clock;
-  const std::vector<int16_t> pcm = Pulse(180, 2);
+  const std::vector<int16_t> pcm = PulseTrack(180, 2);
   const auto* bytes = reinterpret_cast<const uint8_t*>(pcm.data());
   const int32_t size = static_cast<int32_t>(pcm.size() * 2);
   double front = 0, tracker = 0, total = 0;
