@@ -1,0 +1,89 @@
+"""Prints the benchmark figures of scripts/bench as a Markdown table."""
+import json
+import os
+import platform
+import statistics
+import sys
+
+out = sys.argv[1]
+
+
+def medians(name):
+    path = os.path.join(out, name + ".json")
+    if not os.path.exists(path):
+        return {}
+    with open(path) as f:
+        data = json.load(f)
+    result = {}
+    for b in data["benchmarks"]:
+        if b.get("aggregate_name") == "median":
+            result[b["run_name"]] = b
+    return result
+
+
+def cpu_model():
+    try:
+        with open("/proc/cpuinfo") as f:
+            for line in f:
+                if line.startswith("model name"):
+                    return line.split(":", 1)[1].strip()
+    except OSError:
+        pass
+    return platform.processor()
+
+
+rows = []
+fft = medians("real_fft_bench")
+ours, fftw = fft.get("BM_RealFftForward/2048"), fft.get("BM_FftwR2cMeasure/2048")
+if ours:
+    rows.append(("real FFT, 2048 points (double)", f"{ours['real_time']:.0f} ns",
+                 f"{ours['real_time'] / fftw['real_time']:.2f}x FFTW r2c" if fftw else ""))
+
+analysis = medians("analysis_bench")
+whole = analysis.get("BM_WholeAnalysis180sStereo/iterations:3")
+front = analysis.get("BM_SpectrogramAndOnsets60s")
+if front:
+    rows.append(("spectrogram + onsets, 60 s mono", f"{front['real_time']:.1f} ms", ""))
+if whole:
+    rows.append(("whole analysis, 180 s stereo", f"{whole['real_time']:.0f} ms",
+                 f"{whole['realtime_x']:.0f}x real time; tracker {100 * whole['tracker_share']:.0f}%"))
+
+apm = medians("apm_bench")
+for name, b in apm.items():
+    rows.append((f"tracker ({name})", f"{b['real_time'] / 1000:.1f} us" if b["time_unit"] == "ns" else f"{b['real_time']:.1f} {b['time_unit']}", ""))
+
+resampler = medians("resampler_bench")
+for name, b in sorted(resampler.items()):
+    rate = b.get("items_per_second")
+    if rate:
+        rows.append((f"resampler {name}", f"{rate / 1e6:.0f} M frames/s", ""))
+
+programs = {}
+path = os.path.join(out, "programs.txt")
+if os.path.exists(path):
+    with open(path) as f:
+        for line in f:
+            parts = line.split()
+            if len(parts) == 4 and parts[0] in ("aubiotrack", "clipweaver"):
+                programs.setdefault(parts[0], []).append((float(parts[1]) + float(parts[2]), int(parts[3])))
+if "clipweaver" in programs:
+    cpu = statistics.median(c for c, _ in programs["clipweaver"])
+    rss = statistics.median(m for _, m in programs["clipweaver"]) / 1024
+    ratio = ""
+    if "aubiotrack" in programs:
+        ref = statistics.median(c for c, _ in programs["aubiotrack"])
+        ratio = f"{cpu / ref:.2f}x aubiotrack's {ref:.2f} s"
+    rows.append(("`clipweaver beats`, 180 s stereo WAV, CPU", f"{cpu:.2f} s (peak {rss:.0f} MiB)", ratio))
+
+path = os.path.join(out, "memory.txt")
+if os.path.exists(path):
+    with open(path) as f:
+        for line in f:
+            minutes, pcm, native, _ = line.split()
+            rows.append((f"native memory, {minutes} min stereo", f"{native} MiB", f"beside {pcm} MiB of PCM"))
+
+print(f"Measured on {cpu_model()}, {os.cpu_count()} cores; medians of 5 runs.\n")
+print("| measure | value | comparison |")
+print("|---|---|---|")
+for row in rows:
+    print("| " + " | ".join(row) + " |")
