@@ -20,6 +20,8 @@ const std::vector<OptionSpec> kBeatsOptions = {
     {"format", 0, true}, {"jobs", 'j', true},  {"quiet", 'q', false},
     {"verbose", 'v', false}, {"click", 0, true}, {"plot", 0, true},
     {"help", 'h', false}};
+const std::vector<OptionSpec> kResampleOptions = {
+    {"rate", 0, true}, {"gain", 0, true}, {"help", 'h', false}};
 const std::vector<OptionSpec> kExampleOptions = {
     {"bpm", 0, true}, {"seconds", 0, true}, {"rate", 0, true},
     {"channels", 0, true}, {"help", 'h', false}};
@@ -176,6 +178,30 @@ std::string ParseBeats(const Arguments& a, BeatsOptions* out) {
   return "";
 }
 
+std::string ParseResample(const Arguments& a, ResampleSettings* out) {
+  if (a.positional.size() != 2) return "resample needs IN and OUT";
+  out->input = a.positional[0];
+  out->output = a.positional[1];
+  if (!a.values.count("rate")) return "resample needs --rate HZ";
+  if (!ParseInt(a.values.at("rate"), kMinRate, kMaxRate, &out->rate)) {
+    return RateError(a.values.at("rate"));
+  }
+  if (a.values.count("gain")) {
+    const std::string& gain = a.values.at("gain");
+    const size_t comma = gain.find(',');
+    double left = 0, right = 0;
+    // Above 1 the mix could wrap around: the resampler does not clip.
+    if (comma == std::string::npos ||
+        !ParseDouble(gain.substr(0, comma), -1, 1, &left) ||
+        !ParseDouble(gain.substr(comma + 1), -1, 1, &right)) {
+      return "--gain '" + gain + "' is not L,R with both gains from -1 to 1";
+    }
+    out->left_gain = static_cast<float>(left);
+    out->right_gain = static_cast<float>(right);
+  }
+  return "";
+}
+
 std::string ParseExample(const Arguments& a, GrooveSettings* out, std::string* path) {
   if (a.positional.size() != 1) return "example needs exactly one OUT file";
   *path = a.positional[0];
@@ -212,6 +238,7 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
   }
   const std::vector<OptionSpec>* specs =
       command == "beats"      ? &kBeatsOptions
+      : command == "resample" ? &kResampleOptions
       : command == "example"  ? &kExampleOptions
                               : nullptr;
   if (specs == nullptr) {
@@ -231,6 +258,9 @@ CommandLine ParseCommandLine(int argc, const char* const* argv) {
   if (command == "beats") {
     line.error = ParseBeats(parsed, &line.beats);
     line.action = CommandLine::Action::kBeats;
+  } else if (command == "resample") {
+    line.error = ParseResample(parsed, &line.resample);
+    line.action = CommandLine::Action::kResample;
   } else {
     line.error = ParseExample(parsed, &line.example, &line.example_path);
     line.action = CommandLine::Action::kExample;
@@ -254,6 +284,7 @@ std::string OutputName(const std::string& pattern, const std::string& input) {
 const char* HelpText() {
   return R"(Usage:
   clipweaver beats [options] FILE...
+  clipweaver resample IN OUT --rate HZ [--gain L,R]
   clipweaver example OUT [--bpm BPM] [--seconds S] [--rate HZ] [--channels N]
   clipweaver --help | --version
 
@@ -271,6 +302,12 @@ format libsndfile reads will do: WAV, FLAC, Ogg Vorbis, AIFF, ...
   -v, --verbose   let the analysis log through to stderr (no progress bar)
   Files shorter than 1 second are refused. Ctrl-C stops the analysis,
   prints what has finished and exits with status 130.
+
+resample: converts IN to another sample rate with the linear resampler,
+block by block; mono stays mono and stereo stays stereo.
+  --rate HZ       output sample rate (required); at most a 3:1 reduction
+  --gain L,R      gains of the left and right channel from -1 to 1
+                  (default 1,1; a mono file takes L)
 
 example: writes the example groove: a kick on every beat, a snare on beats
 2 and 4 and a hi-hat on every off-beat, the same on every machine.
@@ -291,6 +328,7 @@ Examples:
   clipweaver beats --format json -j 4 music/*.flac > beats.jsonl
   clipweaver beats song.ogg --click song-clicks.wav --plot song.svg
   clipweaver beats *.wav --plot 'plots/{}.svg' --quiet
+  clipweaver resample song.wav song-48k.flac --rate 48000 --gain 0.8,0.8
 )";
 }
 

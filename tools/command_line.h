@@ -7,6 +7,7 @@
 
 #include "tools/example_groove.h"
 #include "tools/report.h"
+#include "tools/resample_file.h"
 
 namespace cwtool {
 
@@ -23,10 +24,11 @@ struct BeatsOptions {
 };
 
 struct CommandLine {
-  enum class Action { kHelp, kVersion, kBeats, kExample, kUsageError };
+  enum class Action { kHelp, kVersion, kBeats, kResample, kExample, kUsageError };
   Action action = Action::kUsageError;
   std::string error;  // for kUsageError
   BeatsOptions beats;
+  ResampleSettings resample;
   GrooveSettings example;
   std::string example_path;
 };

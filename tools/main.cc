@@ -1,10 +1,11 @@
-// clipweaver: the library's beat analysis on sound files.
+// clipweaver: the library's beat analysis and resampler on sound files.
 #include <cstdio>
 #include <string>
 
 #include "tools/beats_command.h"
 #include "tools/command_line.h"
 #include "tools/example_groove.h"
+#include "tools/resample_file.h"
 
 namespace {
 
@@ -20,7 +21,7 @@ int main(int argc, char** argv) {
   const CommandLine line = cwtool::ParseCommandLine(argc, argv);
   switch (line.action) {
     case CommandLine::Action::kHelp:
-      printf("clipweaver %s: beat analysis and an example track\n\n%s",
+      printf("clipweaver %s: beat analysis, resampling and an example track\n\n%s",
              CLIPWEAVER_VERSION, cwtool::HelpText());
       return 0;
     case CommandLine::Action::kVersion:
@@ -31,6 +32,12 @@ int main(int argc, char** argv) {
       return 2;
     case CommandLine::Action::kBeats:
       return cwtool::RunBeats(line.beats);
+    case CommandLine::Action::kResample: {
+      int64_t frames = 0;
+      std::string error;
+      if (!cwtool::ResampleFile(line.resample, &frames, &error)) return Fail(error);
+      return 0;
+    }
     case CommandLine::Action::kExample: {
       std::string error;
       if (!cwtool::WriteGroove(line.example_path, line.example, &error)) {

@@ -53,4 +53,4 @@ def read_wav(name):
     with wave.open(path(name) if not os.path.isabs(name) else name) as w:
         assert w.getsampwidth() == 2
         samples = array.array('h', w.readframes(w.getnframes()))
-        return w.getnchannels(), w.getframerate(), samples
+        return w.getnchannels(), w.getframerate(), samples.tolist()
