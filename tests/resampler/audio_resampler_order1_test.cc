@@ -74,13 +74,6 @@ TEST(Order1Interpolation, FirstFramesFrom44100To48000) {
   EXPECT_EQ(r->getPhaseFraction(), 637534204u);
 }
 
-TEST(Order1Interpolation, StereoChannelsInterpolateIndependently) {
-  auto r = Make(2, 48000, 44100, 1.0f, 1.0f);
-  const Samples out = Resample(
-      r.get(), {1000, -1000, -2000, 2000, 3000, -3000, -4000, 4000, 0, 0}, 2, 10);
-  EXPECT_EQ(out, (Samples{0, 0, 918, -919, -1513, 1512, 1781, -1782, -1725, 1724}));
-}
-
 TEST(Order1Downsampling, ThreeToOneTakesEveryThirdFrame) {
   auto r = Make(1, 16000, 48000);
   ASSERT_EQ(r->getPhaseIncrement(), 3221225472u);

@@ -194,22 +194,5 @@ TEST(AudioResamplerRates, ThreeToOneIsTheLargestSupportedRatio) {
   EXPECT_EQ(r->getOutputSampleCount(481), 0u);
 }
 
-TEST(AudioResamplerRates, OutputSampleCountPerLayout) {
-  // floor(48000 * 441 / 44100) = 480 frames.
-  EXPECT_EQ(Create(16, 1, 48000)->getOutputSampleCount(441), 441u);
-  Resampler mono = Create(16, 1, 48000);
-  mono->setSourceSampleRate(44100);
-  Resampler monoToStereo = Create(16, 1, 48000, AudioResampler::QUALITY_LOW, true);
-  monoToStereo->setSourceSampleRate(44100);
-  Resampler stereo = Create(16, 2, 48000, AudioResampler::QUALITY_LOW, true);
-  stereo->setSourceSampleRate(44100);
-  EXPECT_EQ(mono->getOutputSampleCount(441), 480u);
-  EXPECT_EQ(mono->getOutputSampleCount(440), 478u);  // 478.9 frames
-  EXPECT_EQ(monoToStereo->getOutputSampleCount(441), 960u);
-  EXPECT_EQ(stereo->getOutputSampleCount(441), 960u);
-  EXPECT_EQ(stereo->getOutputSampleCount(0), 0u);
-  EXPECT_EQ(Create(16, 3, 48000)->getOutputSampleCount(441), 0u);
-}
-
 }  // namespace
 }  // namespace norvane

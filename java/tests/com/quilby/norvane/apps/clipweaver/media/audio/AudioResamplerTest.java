@@ -1,0 +1,341 @@
+package com.quilby.norvane.apps.clipweaver.media.audio;
+
+import static org.junit.jupiter.api.Assertions.assertArrayEquals;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertNotEquals;
+import static org.junit.jupiter.api.Assertions.assertThrows;
+
+import java.io.File;
+import java.nio.ByteBuffer;
+import java.nio.ByteOrder;
+import java.nio.charset.StandardCharsets;
+import java.nio.file.Files;
+import java.util.ArrayList;
+import java.util.Arrays;
+import java.util.List;
+import java.util.concurrent.TimeUnit;
+import java.util.function.Consumer;
+import org.junit.jupiter.api.Test;
+import org.junit.jupiter.params.ParameterizedTest;
+import org.junit.jupiter.params.provider.CsvSource;
+
+public class AudioResamplerTest {
+  private static final byte FILL = 0x55;
+  private static final short FILL_SAMPLE = 0x5555;
+
+  private static ByteBuffer context() {
+    return ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
+  }
+
+  private static ByteBuffer created(int channels, int rate, boolean stereoOutput) {
+    ByteBuffer context = context();
+    AudioResampler.createNativeResampler(context, 2, channels, rate, stereoOutput);
+    return context;
+  }
+
+  private static byte[] pcm(int... samples) {
+    ByteBuffer bytes = ByteBuffer.allocate(2 * samples.length).order(ByteOrder.nativeOrder());
+    for (int s : samples) bytes.putShort((short) s);
+    return bytes.array();
+  }
+
+  private static short[] samples(byte[] bytes) {
+    short[] samples = new short[bytes.length / 2];
+    ByteBuffer.wrap(bytes).order(ByteOrder.nativeOrder()).asShortBuffer().get(samples);
+    return samples;
+  }
+
+  private static ByteBuffer direct(byte[] bytes) {
+    ByteBuffer buffer = ByteBuffer.allocateDirect(bytes.length);
+    buffer.put(bytes).clear();
+    return buffer;
+  }
+
+  private static byte[] filled(int size) {
+    byte[] bytes = new byte[size];
+    Arrays.fill(bytes, FILL);
+    return bytes;
+  }
+
+  @Test
+  void contextHoldsInstanceChannelCountAndStereoFlag() {
+    assertEquals(16, AudioResampler.getNativeResamplerContextSize());
+    ByteBuffer stereo = context();
+    for (int i = 13; i < 16; i++) stereo.put(i, (byte) 0x5a);
+    AudioResampler.createNativeResampler(stereo, 2, 2, 48000, false);
+    assertNotEquals(0L, stereo.getLong(0));
+    assertEquals(2, stereo.getInt(8));
+    assertEquals(0, stereo.get(12));
+    for (int i = 13; i < 16; i++) assertEquals(0x5a, stereo.get(i), "reserved byte " + i);
+
+    ByteBuffer monoToStereo = created(1, 44100, true);
+    assertEquals(1, monoToStereo.getInt(8));
+    assertEquals(1, monoToStereo.get(12));
+
+    AudioResampler.releaseNativeResampler(stereo);
+    assertEquals(0L, stereo.getLong(0));
+    AudioResampler.releaseNativeResampler(stereo);
+    AudioResampler.setVolume(stereo, 2, 2);
+    AudioResampler.setSourceSampleRate(stereo, 44100);
+    byte[] output = filled(40);
+    AudioResampler.resampleFromByteArray(stereo, pcm(1, 2, 3, 4), 0, 4, output, 10, false);
+    assertArrayEquals(filled(40), output);
+    AudioResampler.releaseNativeResampler(monoToStereo);
+  }
+
+  @Test
+  void freshInstancePassesStereoThroughAtUnitGainOneFrameLate() {
+    ByteBuffer context = created(2, 48000, false);
+    byte[] output = new byte[12];
+    AudioResampler.resampleFromByteArray(
+        context, pcm(100, -100, 200, -200, 300, -300), 0, 6, output, 3, false);
+    assertArrayEquals(new short[] {0, 0, 100, -100, 200, -200}, samples(output));
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  @ParameterizedTest(name = "{0} channels, stereo output {1}: {2} bytes")
+  @CsvSource({"2, false, 400", "2, true, 400", "1, true, 400", "1, false, 200"})
+  void clearsTwoBytesPerOutputSampleOfTheFramesAsked(int channels, boolean stereo, int bytes) {
+    ByteBuffer context = created(channels, 48000, stereo);
+    byte[] output = filled(1000);
+    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, output, 100, false);
+    byte[] expected = filled(1000);
+    Arrays.fill(expected, 0, bytes, (byte) 0);
+    assertArrayEquals(expected, output);
+
+    byte[] kept = filled(1000);
+    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, kept, 100, true);
+    assertArrayEquals(filled(1000), kept);
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  // 441 input frames at 44100 Hz make 480 output frames at 48000 Hz.
+  @ParameterizedTest(name = "{0} channels, stereo output {1}")
+  @CsvSource({"1, false, 480", "1, true, 960", "2, false, 960"})
+  void writesTheOutputCountOfTheInputFrames(int channels, boolean stereo, int written) {
+    ByteBuffer context = created(channels, 48000, stereo);
+    AudioResampler.setSourceSampleRate(context, 44100);
+    int[] input = new int[441 * channels];
+    Arrays.fill(input, 1000);
+    byte[] output = filled(4000);
+    AudioResampler.resampleFromByteArray(context, pcm(input), 0, input.length, output, 0, false);
+    short[] out = samples(output);
+    int perFrame = written / 480;
+    for (int i = perFrame; i < written; i++) assertNotEquals(FILL_SAMPLE, out[i], "sample " + i);
+    for (int i = written; i < out.length; i++) assertEquals(FILL_SAMPLE, out[i], "sample " + i);
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  // Weights 0, 30105, 27443, 24780 and 22118 (of 32768) between neighbouring
+  // input frames, the first two from the silent frame before the input.
+  @ParameterizedTest(name = "{0} at byte offset {1}")
+  @CsvSource({"array, 0", "array, 1", "buffer, 0", "buffer, 3"})
+  void interpolatesFrom44100To48000(String source, int offset) {
+    ByteBuffer context = created(1, 48000, false);
+    AudioResampler.setSourceSampleRate(context, 44100);
+    byte[] block = pcm(1000, -2000, 3000, -4000, 0);
+    byte[] input = new byte[offset + block.length];
+    System.arraycopy(block, 0, input, offset, block.length);
+    byte[] output = new byte[10];
+    if (source.equals("array")) {
+      AudioResampler.resampleFromByteArray(context, input, offset, 5, output, 5, false);
+    } else {
+      AudioResampler.resampleFromByteBuffer(context, direct(input), offset, 5, output, 5, false);
+    }
+    assertArrayEquals(new short[] {0, 918, -1513, 1781, -1725}, samples(output));
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  @Test
+  void accumulatingMixesIntoTheOutputAndWrapsAround() {
+    ByteBuffer context = created(1, 44100, true);
+    AudioResampler.setVolume(context, 1.0f, -0.5f);
+    byte[] output = pcm(10, 20, 30, 40, 30000, -30000);
+    AudioResampler.resampleFromByteArray(context, pcm(4, 30000, 0), 0, 3, output, 0, true);
+    // -30000 + -15000 wraps to 20536.
+    assertArrayEquals(new short[] {10, 20, 34, 38, -5536, 20536}, samples(output));
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  @Test
+  void heapInputBufferLeavesTheOutputUntouched() {
+    ByteBuffer context = created(2, 48000, false);
+    byte[] output = filled(100);
+    AudioResampler.resampleFromByteBuffer(
+        context, ByteBuffer.wrap(pcm(1, 2, 3, 4)), 0, 4, output, 20, false);
+    assertArrayEquals(filled(100), output);
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  // Each case is a call that would read or write out of bounds, or has no
+  // usable context: the output stays as it was.
+  @ParameterizedTest(name = "{0}")
+  @CsvSource({
+    "clearing beyond the output, 2, 0, 4, 40, 11, false",
+    "samples beyond the output, 2, 0, 882, 40, 0, true",
+    "negative offset, 2, -2, 4, 40, 2, false",
+    "negative length, 2, 0, -4, 40, 2, false",
+    "length beyond the input, 2, 2, 882, 4000, 2, false",
+    "offset beyond the input, 2, 1765, 0, 40, 2, false",
+    "huge length, 2, 0, 2147483647, 40, 2, false",
+    "negative clearing, 2, 0, 4, 400, -1, false",
+    "huge clearing, 2, 0, 4, 400, 2147483647, false",
+    "no channels, 0, 0, 4, 40, 2, false",
+    "negative channels, -2, 0, 4, 40, 2, false",
+  })
+  void badBlocksWriteNothing(
+      String name, int channels, int offset, int length, int outputBytes, int frames,
+      boolean accumulate) {
+    for (boolean fromBuffer : new boolean[] {false, true}) {
+      ByteBuffer context = created(channels, 48000, false);
+      byte[] input = pcm(new int[882]);
+      byte[] output = filled(outputBytes);
+      if (fromBuffer) {
+        AudioResampler.resampleFromByteBuffer(
+            context, direct(input), offset, length, output, frames, accumulate);
+      } else {
+        AudioResampler.resampleFromByteArray(
+            context, input, offset, length, output, frames, accumulate);
+      }
+      assertArrayEquals(filled(outputBytes), output, name + (fromBuffer ? " (buffer)" : ""));
+      AudioResampler.releaseNativeResampler(context);
+    }
+  }
+
+  @Test
+  void unusableContextsAreIgnored() {
+    ByteBuffer small = ByteBuffer.allocateDirect(8);
+    ByteBuffer heap = ByteBuffer.allocate(16);
+    for (ByteBuffer context : new ByteBuffer[] {small, heap, context(), null}) {
+      AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
+      AudioResampler.setVolume(context, 1, 1);
+      AudioResampler.setSourceSampleRate(context, 44100);
+      byte[] output = filled(20);
+      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
+      if (context != null && context.isDirect() && context.capacity() >= 16) {
+        assertNotEquals(0L, context.getLong(0));
+        AudioResampler.releaseNativeResampler(context);
+        continue;
+      }
+      assertArrayEquals(filled(20), output);
+      AudioResampler.releaseNativeResampler(context);
+    }
+    assertEquals(0L, small.getLong(0));
+    assertEquals(0L, heap.getLong(0));
+  }
+
+  @Test
+  void wrapperResamplesLikeTheRawBridge() {
+    byte[] input = new byte[2 * 2 * 441];
+    new java.util.Random(7).nextBytes(input);
+    ByteBuffer context = created(2, 48000, false);
+    AudioResampler.setSourceSampleRate(context, 44100);
+    AudioResampler.setVolume(context, 0.5f, 2.0f);
+    byte[] expected = new byte[4 * 480];
+    for (int block = 0; block < 3; block++) {
+      AudioResampler.resampleFromByteArray(context, input, 0, 882, expected, 480, false);
+    }
+    AudioResampler.releaseNativeResampler(context);
+
+    try (AudioResampler resampler = new AudioResampler(2, 48000, false)) {
+      resampler.setSourceSampleRate(44100);
+      resampler.setVolume(0.5f, 2.0f);
+      assertEquals(480, resampler.getOutputFrameCount(441));
+      assertEquals(2, resampler.getOutputChannelCount());
+      byte[] output = new byte[4 * 480];
+      resampler.resample(input, 0, 882, output, 480, false);
+      resampler.resample(direct(input), 0, 882, output, 480, false);
+      resampler.resample(input, 0, 882, output, 480, false);
+      assertArrayEquals(expected, output);
+    }
+  }
+
+  @Test
+  void wrapperRejectsBadArgumentsBeforeTheNativeCall() {
+    assertThrows(IllegalArgumentException.class, () -> new AudioResampler(3, 48000, false));
+    assertThrows(IllegalArgumentException.class, () -> new AudioResampler(1, 0, false));
+    AudioResampler resampler = new AudioResampler(1, 16000, true);
+    assertEquals(2, resampler.getOutputChannelCount());
+    assertThrows(IllegalArgumentException.class, () -> resampler.setSourceSampleRate(0));
+    assertThrows(IllegalArgumentException.class, () -> resampler.setSourceSampleRate(48001));
+    resampler.setSourceSampleRate(48000);
+    assertEquals(48000, resampler.getSourceSampleRate());
+    byte[] input = new byte[960];
+    assertThrows(IndexOutOfBoundsException.class,
+        () -> resampler.resample(input, 2, 480, new byte[640], 0, true));
+    assertThrows(IndexOutOfBoundsException.class,
+        () -> resampler.resample(input, 0, 480, new byte[639], 0, true));
+    assertThrows(IndexOutOfBoundsException.class,
+        () -> resampler.resample(input, 0, 0, new byte[640], 161, false));
+    assertThrows(IllegalArgumentException.class,
+        () -> resampler.resample(ByteBuffer.wrap(input), 0, 480, new byte[640], 0, true));
+    resampler.resample(input, 0, 480, new byte[640], 160, false);
+    resampler.close();
+    resampler.close();
+    assertThrows(IllegalStateException.class, () -> resampler.setVolume(1, 1));
+    assertThrows(IllegalStateException.class,
+        () -> resampler.resample(input, 0, 480, new byte[640], 160, false));
+  }
+
+  @Test
+  void logsEachProblemOnce() throws Exception {
+    List<String> lines = runChild(LogScenario.class);
+    assertEquals(
+        List.of(
+            "AudioResampler : Unsupported sample format, 8 bits, 1 channels",
+            "AudioResampler : Unsupported resampling from 0 Hz to 48000 Hz: no output",
+            "native : audio_resampler_jni.cc: Resampler output of 10 bytes is too small for"
+                + " 2000 bytes to clear and 0 bytes to resample: nothing resampled.",
+            "native : audio_resampler_jni.cc: Resampler input of 8 samples at byte 0 exceeds"
+                + " the 4 bytes given: nothing resampled."),
+        lines);
+  }
+
+  /** The calls of {@link #logsEachProblemOnce}, run in a child JVM whose stderr is read. */
+  public static final class LogScenario {
+    public static void main(String[] args) {
+      ByteBuffer context = context();
+      AudioResampler.createNativeResampler(context, 1, 1, 48000, false);
+      AudioResampler.releaseNativeResampler(context);
+      context = created(1, 48000, false);
+      AudioResampler.setSourceSampleRate(context, 0);
+      byte[] output = new byte[10];
+      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
+      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
+      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 1000, false);
+      AudioResampler.resampleFromByteBuffer(context, direct(pcm(1, 2)), 0, 8, output, 0, false);
+      AudioResampler.releaseNativeResampler(context);
+    }
+  }
+
+  // Native lines go to the process's stderr, which only a parent process can
+  // read. Line numbers are left out of the returned lines.
+  private static List<String> runChild(Class<?> mainClass) throws Exception {
+    List<String> command = new ArrayList<>();
+    command.add(System.getProperty("java.home") + File.separator + "bin" + File.separator + "java");
+    command.add("-Djava.library.path=" + System.getProperty("java.library.path"));
+    command.add("-cp");
+    command.add(System.getProperty("clipweaver.classpath", System.getProperty("java.class.path")));
+    command.add(mainClass.getName());
+    File err = File.createTempFile("resampler", ".err");
+    try {
+      Process process =
+          new ProcessBuilder(command)
+              .redirectInput(ProcessBuilder.Redirect.from(new File("/dev/null")))
+              .redirectOutput(ProcessBuilder.Redirect.DISCARD)
+              .redirectError(err)
+              .start();
+      if (!process.waitFor(120, TimeUnit.SECONDS)) {
+        process.destroyForcibly();
+        throw new AssertionError("child JVM timed out");
+      }
+      assertEquals(0, process.exitValue());
+      List<String> lines = new ArrayList<>();
+      Consumer<String> keep = line -> lines.add(line.replaceFirst("\\.cc:[0-9]+ ", ".cc: "));
+      Files.readString(err.toPath(), StandardCharsets.UTF_8).lines().forEach(keep);
+      return lines;
+    } finally {
+      err.delete();
+    }
+  }
+}
