@@ -1,0 +1,81 @@
+// Analyses and resamplers on several threads at once share nothing but the
+// log facility and the resampler load counter: every thread must get the
+// single-threaded results, and the counter must return to where it started.
+#include <gtest/gtest.h>
+
+#include <cstring>
+#include <memory>
+#include <thread>
+#include <vector>
+
+#include "jni/apm/audio_analyzer.h"
+#include "resampler/audio_resampler.h"
+
+namespace {
+
+std::vector<uint8_t> Clicks(int rate, double period, int seconds) {
+  std::vector<uint8_t> pcm(static_cast<size_t>(rate) * seconds * 2);
+  for (size_t i = 0; i < pcm.size() / 2; ++i) {
+    const size_t since = i % static_cast<size_t>(rate * period);
+    const int16_t v = since < 200 ? static_cast<int16_t>((since % 20) * 1500 - 15000)
+                                  : static_cast<int16_t>((i * 7919) % 64 - 32);
+    std::memcpy(&pcm[2 * i], &v, 2);
+  }
+  return pcm;
+}
+
+std::vector<float> Beats(const std::vector<uint8_t>& pcm, int rate) {
+  apm::AudioAnalyzer analyzer(rate);
+  const int32_t n = analyzer.CalculateBeats(
+      pcm.data(), static_cast<int32_t>(pcm.size()), 1, [](char) { return false; });
+  return n > 0 ? std::vector<float>(analyzer.beats(), analyzer.beats() + n)
+               : std::vector<float>();
+}
+
+std::vector<int16_t> Resampled(int32_t from, int32_t to, int blocks) {
+  std::unique_ptr<norvane::AudioResampler> resampler(norvane::AudioResampler::create(
+      16, 2, to, norvane::AudioResampler::QUALITY_DEFAULT, false));
+  resampler->setSourceSampleRate(from);
+  resampler->setVolume(0.5f, 1.0f);
+  std::vector<int16_t> in(2 * 441), all;
+  for (int b = 0; b < blocks; ++b) {
+    for (size_t i = 0; i < in.size(); ++i) in[i] = static_cast<int16_t>((b * 131 + i * 17) % 20000);
+    std::vector<int16_t> out(2 * (static_cast<size_t>(to) * 441 / from + 1), 0);
+    resampler->resample(out.data(), in.data(), 441);
+    all.insert(all.end(), out.begin(), out.end());
+  }
+  return all;
+}
+
+TEST(Threads, AnalysesAndResamplersMatchTheirSingleThreadedResults) {
+  const uint32_t load_before = norvane::AudioResampler::getCurrentLoadMHz();
+  const int kThreads = 6;
+  std::vector<std::vector<uint8_t>> tracks;
+  std::vector<std::vector<float>> beats;
+  std::vector<std::vector<int16_t>> resampled;
+  for (int i = 0; i < kThreads; ++i) {
+    tracks.push_back(Clicks(8000, 0.4 + 0.05 * i, 6));
+    beats.push_back(Beats(tracks[i], 8000));
+    resampled.push_back(Resampled(44100, 48000 - 4000 * i, 20));
+  }
+  testing::internal::CaptureStderr();
+  std::vector<std::thread> threads;
+  std::vector<int> mismatches(kThreads, 0);
+  for (int i = 0; i < kThreads; ++i) {
+    threads.emplace_back([&, i] {
+      for (int round = 0; round < 3; ++round) {
+        if (Beats(tracks[i], 8000) != beats[i]) ++mismatches[i];
+        if (Resampled(44100, 48000 - 4000 * i, 20) != resampled[i]) ++mismatches[i];
+      }
+    });
+  }
+  for (std::thread& thread : threads) thread.join();
+  testing::internal::GetCapturedStderr();
+  for (int i = 0; i < kThreads; ++i) {
+    EXPECT_FALSE(beats[i].empty()) << i;
+    EXPECT_EQ(mismatches[i], 0) << i;
+  }
+  EXPECT_EQ(norvane::AudioResampler::getCurrentLoadMHz(), load_before);
+}
+
+}  // namespace
