@@ -172,13 +172,26 @@ bool Apm::SetUpStates() {
   beam_.assign(std::max(config_.beam_width, lag_count_), 0);
   std::copy(lag_first_state_.begin(), lag_first_state_.end(), beam_.begin());
 
-  on_beat_.assign(lag_count_, 0);
   live_stamp_.assign(state_count_, -1);
   candidates_.reserve(state_count_);
   candidate_lag_.assign(state_count_, 0);
   candidate_offset_.assign(state_count_, 0);
   candidate_observation_.assign(state_count_, 0.0);
   candidate_prior_.assign(state_count_, 0.0);
+  entry_base_.assign(beam_.size(), 0.0);
+  entry_lag_.assign(beam_.size(), 0);
+  entry_offset_.assign(beam_.size(), 0);
+  best_.assign(lag_count_, 0.0);
+  best_from_.assign(lag_count_, 0);
+  on_beat_transition_.SetUp(lag_count_, period_change_score_,
+                            phase_deviation_score_);
+  frame_phase_.assign(lag_count_, 0);
+  changed_.assign(value_count_, {});
+  first_child_.assign(state_count_, -1);
+  next_sibling_.assign(state_count_, -1);
+  previous_sibling_.assign(state_count_, -1);
+  linked_parent_.assign(state_count_, -1);
+  is_parent_.assign(state_count_, 0);
   return true;
 }
 
@@ -204,70 +217,57 @@ void Apm::Observe(int32_t t) {
   }
 }
 
+// Candidates: the on-beat state of every lag (lag index order), then the
+// states whose best predecessor has left the beam.
 void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
+  const double* comb = comb_.row(t % comb_rows_);
+  candidates_.clear();
   for (int32_t i = 0; i < lag_count_; ++i) {
-    on_beat_[i] = lag_first_state_[i] + t % lag_frames_[i];
+    if (t > 0 && ++frame_phase_[i] == lag_frames_[i]) frame_phase_[i] = 0;
+    candidates_.push_back(lag_first_state_[i] + frame_phase_[i]);
+    observation_[candidates_.back()] = comb[i];
   }
   const double* values = values_.row(cur);
   for (int32_t k = 0; k < active; ++k) {
     if (values[beam_[k]] != kImpossible) live_stamp_[beam_[k]] = t;
   }
-  // On-beat states, and states whose best predecessor has left the beam.
-  // Nothing has a predecessor before the first frame.
-  candidates_.clear();
-  size_t beat = 0;
-  for (int32_t s = 0; s < state_count_; ++s) {
-    if (beat < on_beat_.size() && on_beat_[beat] == s) {
-      candidates_.push_back(s);
-      ++beat;
-    } else if (predecessor_[s] != -1 && live_stamp_[predecessor_[s]] != t) {
-      candidates_.push_back(s);
+  size_t kept = 0;
+  for (const int32_t parent : parents_) {
+    if (first_child_[parent] == -1) {
+      is_parent_[parent] = 0;
+      continue;
+    }
+    parents_[kept++] = parent;
+    if (live_stamp_[parent] == t) continue;
+    for (int32_t s = first_child_[parent]; s != -1; s = next_sibling_[s]) {
+      if (state_phase_[s] != frame_phase_[state_lag_[s] - min_lag_]) {
+        candidates_.push_back(s);
+      }
     }
   }
+  parents_.resize(kept);
 
   double* next_values = values_.row(next);
-  if (next != cur) std::copy_n(values, state_count_, next_values);
+  if (next != cur) CatchUpRow(t, values, next_values);
+  changed_[t % value_count_] = candidates_;
   for (int32_t c : candidates_) next_values[c] = kImpossible;
-  const double* comb = comb_.row(t % comb_rows_);
-  for (int32_t i = 0; i < lag_count_; ++i) observation_[on_beat_[i]] = comb[i];
 }
 
-// Re-scores every candidate from every beam entry. The per-candidate and
-// per-entry terms are looked up once; the sum keeps its grouping.
-void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
-  const int32_t count = static_cast<int32_t>(candidates_.size());
-  for (int32_t j = 0; j < count; ++j) {
-    const int32_t c = candidates_[j];
-    candidate_lag_[j] = state_lag_[c];
-    candidate_offset_[j] = WrappedOffset(t, state_lag_[c], state_phase_[c]);
-    candidate_observation_[j] = observation_[c];
-    candidate_prior_[j] = tempo_prior_[state_lag_[c] - min_lag_];
+// Row next is behind row cur by the candidates of the frames since it was
+// last written; copying just those is usually far less than the whole row.
+void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
+  const int32_t frames = std::min(value_count_ - 1, t);
+  size_t behind = 0;
+  for (int32_t back = 1; back <= frames; ++back) {
+    behind += changed_[(t - back) % value_count_].size();
   }
-  const int32_t last_period = config_.period_table_size - 1;
-  const int32_t last_phase = config_.phase_table_size - 1;
-  // Rows cur and next are one when the ring has a single row; entries read
-  // later then see this frame's updates.
-  const double* values = values_.row(cur);
-  double* next_values = values_.row(next);
-  for (int32_t k = 0; k < active; ++k) {
-    const int32_t f = beam_[k];
-    const double base =
-        config_.beat_bonus + (values[f] == kImpossible ? 0.0 : values[f]);
-    const int32_t lag = state_lag_[f];
-    const int32_t offset = WrappedOffset(t, lag, state_phase_[f]);
-    for (int32_t j = 0; j < count; ++j) {
-      const double period = period_change_score_[std::min(
-          std::abs(candidate_lag_[j] - lag), last_period)];
-      const double phase = phase_deviation_score_[std::min(
-          std::abs(offset - candidate_offset_[j]), last_phase)];
-      const double score =
-          base + (((candidate_observation_[j] + period) + phase) +
-                  candidate_prior_[j]);
-      const int32_t c = candidates_[j];
-      if (score > next_values[c]) {
-        next_values[c] = score;
-        predecessor_[c] = f;
-      }
+  if (behind * 8 >= static_cast<size_t>(state_count_)) {
+    std::copy_n(values, state_count_, next_values);
+    return;
+  }
+  for (int32_t back = 1; back <= frames; ++back) {
+    for (int32_t s : changed_[(t - back) % value_count_]) {
+      next_values[s] = values[s];
     }
   }
 }
@@ -294,8 +294,9 @@ void Apm::Run(std::function<bool(float)> progress) {
 }
 
 void Apm::SelectBeam(int32_t t, int32_t next) {
-  selector_.Select(values_.row(next), state_count_, config_.beam_width,
-                   beam_.data());
+  selector_.Reselect(values_.row(next), state_count_, candidates_.data(),
+                     static_cast<int32_t>(candidates_.size()),
+                     config_.beam_width, beam_.data());
   uint16_t* states = beam_states_.row(t + 1);
   uint16_t* predecessors = beam_predecessors_.row(t + 1);
   for (int32_t k = 0; k < config_.beam_width; ++k) {
@@ -307,81 +308,80 @@ void Apm::SelectBeam(int32_t t, int32_t next) {
   }
 }
 
-void BeamSelector::Select(const double* values, int32_t count,
-                          int32_t width, int32_t* beam) {
-  // Spare ranks below the beam, so that the next row usually still has
-  // more than width values at or above the floor.
-  constexpr size_t kSpare = 16;
-  above_.clear();
-  for (int32_t s = 0; s < count; ++s) {
-    if (!has_floor_ || values[s] >= floor_) above_.push_back({s, values[s]});
-  }
-  const auto larger = [](const BeamEntry& a, const BeamEntry& b) {
-    return a.value > b.value;
-  };
-  // Only a value below the beam shows that the beam's values are above all
-  // the others.
-  bool distinct = above_.size() > static_cast<size_t>(width);
-  const auto first_out = above_.begin() + (distinct ? width : 0);
-  if (distinct) {
-    std::nth_element(above_.begin(), first_out, above_.end(), larger);
-    std::sort(above_.begin(), first_out, larger);
-    for (auto it = above_.begin(); distinct && it != first_out; ++it) {
-      distinct = it->value > (it + 1)->value;
+// The best of all beam entries for every candidate; for the on-beat states
+// through the grouped scoring when it applies.
+void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
+  // With a single value row, entries read later see this frame's updates,
+  // which only the pass in beam order reproduces.
+  if (next == cur) {
+    TransitionOneByOne(cur, next, active);
+  } else {
+    const double* values = values_.row(cur);
+    for (int32_t k = 0; k < active; ++k) {
+      const int32_t f = beam_[k];
+      entry_base_[k] =
+          config_.beat_bonus + (values[f] == kImpossible ? 0.0 : values[f]);
+      entry_lag_[k] = state_lag_[f] - min_lag_;
+      entry_offset_[k] = Offset(f);
+    }
+    double* next_values = values_.row(next);
+    size_t first = 0;
+    if (on_beat_transition_.Score(
+            entry_base_.data(), entry_lag_.data(), entry_offset_.data(), active,
+            comb_.row(t % comb_rows_), tempo_prior_.data(), best_.data(),
+            best_from_.data())) {
+      for (int32_t j = 0; j < lag_count_; ++j) {
+        const int32_t c = candidates_[j];
+        if (best_[j] > next_values[c]) {
+          next_values[c] = best_[j];
+          predecessor_[c] = beam_[best_from_[j]];
+        }
+      }
+      first = lag_count_;
+    }
+    for (size_t i = first; i < candidates_.size(); ++i) {
+      ScoreCandidate(candidates_[i], active, next_values);
     }
   }
-  has_floor_ = distinct;
-  if (!distinct) {
-    SelectByHeap(values, count, width, beam);
-    return;
+  for (int32_t c : candidates_) {
+    if (predecessor_[c] != linked_parent_[c]) Relink(c);
   }
-  // The heap keeps exactly these and pops them in ascending order.
-  for (int32_t k = 0; k < width; ++k) beam[k] = above_[width - 1 - k].state;
-  const size_t spare = std::min(above_.size() - 1 - width, kSpare);
-  std::nth_element(first_out, first_out + spare, above_.end(), larger);
-  floor_ = first_out[spare].value;
 }
 
-void BeamSelector::SelectByHeap(const double* values, int32_t count,
-                                int32_t width, int32_t* beam) {
-  heap_.clear();
-  for (int32_t s = 0; s < count; ++s) {
-    if (static_cast<int32_t>(heap_.size()) < width) {
-      Push(s, values[s]);
-    } else if (!(heap_[0].value >= values[s])) {
-      Pop();
-      Push(s, values[s]);
+// One candidate from the gathered beam entries: what the pass over all
+// candidates does for it when the rows are apart.
+void Apm::ScoreCandidate(int32_t c, int32_t active, double* next_values) {
+  const int32_t lag = state_lag_[c] - min_lag_;
+  const int32_t offset = Offset(c);
+  const double observation = observation_[c];
+  const double prior = tempo_prior_[lag];
+  const int32_t last_period = config_.period_table_size - 1;
+  const int32_t last_phase = config_.phase_table_size - 1;
+  double best = next_values[c];
+  int32_t from = -1;
+  for (int32_t k = 0; k < active; ++k) {
+    const double period = period_change_score_[std::min(
+        std::abs(lag - entry_lag_[k]), last_period)];
+    const double phase = phase_deviation_score_[std::min(
+        std::abs(entry_offset_[k] - offset), last_phase)];
+    const double score =
+        entry_base_[k] + (((observation + period) + phase) + prior);
+    if (score > best) {
+      best = score;
+      from = k;
     }
   }
-  for (int32_t k = 0; k < width; ++k) beam[k] = Pop().state;
+  if (from != -1) {
+    next_values[c] = best;
+    predecessor_[c] = beam_[from];
+  }
 }
 
-void BeamSelector::Push(int32_t state, double value) {
-  size_t i = heap_.size();
-  heap_.push_back({state, value});
-  while (i > 0 && !(value >= heap_[(i - 1) / 2].value)) {
-    heap_[i] = heap_[(i - 1) / 2];
-    i = (i - 1) / 2;
-  }
-  heap_[i] = {state, value};
-}
-
-BeamEntry BeamSelector::Pop() {
-  const BeamEntry root = heap_[0];
-  const BeamEntry sifted = heap_.back();
-  const size_t size = heap_.size() - 1;
-  size_t i = 0;
-  for (size_t child = 1; child < size; child = 2 * i + 1) {
-    if (child + 1 < size && !(heap_[child + 1].value >= heap_[child].value)) {
-      ++child;
-    }
-    if (!(sifted.value >= heap_[child].value)) break;
-    heap_[i] = heap_[child];
-    i = child;
-  }
-  heap_[i] = sifted;
-  heap_.pop_back();
-  return root;
+// The state's wrapped phase offset at the current frame.
+int32_t Apm::Offset(int32_t state) const {
+  const int32_t lag = state_lag_[state];
+  return WrappedPhaseOffset(frame_phase_[lag - min_lag_], lag,
+                            state_phase_[state]);
 }
 
 // Row t of the beam tables holds the beam after frame t - 1, so it names
@@ -419,6 +419,67 @@ int32_t Apm::BestFinalState() const {
   return state;
 }
 
+// Scores every candidate from every beam entry in turn. The per-candidate
+// and per-entry terms are looked up once; the sum keeps its grouping.
+void Apm::TransitionOneByOne(int32_t cur, int32_t next, int32_t active) {
+  const int32_t count = static_cast<int32_t>(candidates_.size());
+  for (int32_t j = 0; j < count; ++j) {
+    const int32_t c = candidates_[j];
+    candidate_lag_[j] = state_lag_[c];
+    candidate_offset_[j] = Offset(c);
+    candidate_observation_[j] = observation_[c];
+    candidate_prior_[j] = tempo_prior_[state_lag_[c] - min_lag_];
+  }
+  const int32_t last_period = config_.period_table_size - 1;
+  const int32_t last_phase = config_.phase_table_size - 1;
+  const double* values = values_.row(cur);
+  double* next_values = values_.row(next);
+  for (int32_t k = 0; k < active; ++k) {
+    const int32_t f = beam_[k];
+    const double base =
+        config_.beat_bonus + (values[f] == kImpossible ? 0.0 : values[f]);
+    const int32_t lag = state_lag_[f];
+    const int32_t offset = Offset(f);
+    for (int32_t j = 0; j < count; ++j) {
+      const double period = period_change_score_[std::min(
+          std::abs(candidate_lag_[j] - lag), last_period)];
+      const double phase = phase_deviation_score_[std::min(
+          std::abs(offset - candidate_offset_[j]), last_phase)];
+      const double score =
+          base + (((candidate_observation_[j] + period) + phase) +
+                  candidate_prior_[j]);
+      const int32_t c = candidates_[j];
+      if (score > next_values[c]) {
+        next_values[c] = score;
+        predecessor_[c] = f;
+      }
+    }
+  }
+}
+
+// Moves a state to the list of its current predecessor.
+void Apm::Relink(int32_t state) {
+  const int32_t parent = predecessor_[state];
+  const int32_t old = linked_parent_[state];
+  const int32_t before = previous_sibling_[state];
+  const int32_t after = next_sibling_[state];
+  if (old != -1) {
+    (before == -1 ? first_child_[old] : next_sibling_[before]) = after;
+    if (after != -1) previous_sibling_[after] = before;
+  }
+  previous_sibling_[state] = -1;
+  next_sibling_[state] = first_child_[parent];
+  if (first_child_[parent] != -1) {
+    previous_sibling_[first_child_[parent]] = state;
+  }
+  first_child_[parent] = state;
+  linked_parent_[state] = parent;
+  if (!is_parent_[parent]) {
+    is_parent_[parent] = 1;
+    parents_.push_back(parent);
+  }
+}
+
 void Apm::PlaceBeats() {
   beat_times_ =
       BeatFramesToSeconds(PlaceBeatFrames(path_, state_lag_, state_phase_,
@@ -428,11 +489,7 @@ void Apm::PlaceBeats() {
 }
 
 int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase) {
-  const int32_t half = lag / 2;
-  int32_t x = t % lag - phase;
-  if (x <= -half) x += lag;
-  if (x > half) x -= lag;
-  return x;
+  return WrappedPhaseOffset(t % lag, lag, phase);
 }
 
 std::vector<int32_t> PlaceBeatFrames(const std::vector<int32_t>& path,

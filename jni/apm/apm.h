@@ -12,6 +12,9 @@
 #include <functional>
 #include <vector>
 
+#include "jni/apm/apm_transition.h"
+#include "jni/apm/beam_selector.h"
+
 namespace apm {
 
 struct ApmConfig {
@@ -46,39 +49,15 @@ struct ApmConfig {
 // the given lag and phase, positive after the beat.
 int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase);
 
-struct BeamEntry {
-  int32_t state;
-  double value;
-};
-
-// Writes to beam[0..width) the indices of the width largest of
-// values[0..count), smallest first, exactly as a binary min-heap fed in
-// index order leaves them: once the heap is full a larger value replaces
-// the root, and equal values come out in the order its push and pop give
-// them. Needs count >= width and no NaN.
-class BeamSelector {
- public:
-  void Select(const double* values, int32_t count, int32_t width,
-              int32_t* beam);
-  // The heap itself. Select takes a shortcut, with the same result, when
-  // the width largest values are distinct and above all the others.
-  void SelectByHeap(const double* values, int32_t count, int32_t width,
-                    int32_t* beam);
-
- private:
-  // A binary heap with the smallest value at the root. Push sifts up past
-  // every larger parent; Pop moves the last entry to the root and sifts it
-  // down past every child it is at least equal to.
-  void Push(int32_t state, double value);
-  BeamEntry Pop();
-
-  std::vector<BeamEntry> heap_;
-  std::vector<BeamEntry> above_;
-  // Rows change little from frame to frame, so the last row's ranking
-  // tells which values can matter in the next.
-  double floor_ = 0.0;
-  bool has_floor_ = false;
-};
+// The same, given t mod lag.
+inline int32_t WrappedPhaseOffset(int32_t position, int32_t lag,
+                                  int32_t phase) {
+  const int32_t half = lag / 2;
+  int32_t x = position - phase;
+  x += x <= -half ? lag : 0;
+  x -= x > half ? lag : 0;
+  return x;
+}
 
 // Frames of a best-state path (path[t] indexes state_lag and state_phase)
 // that get a beat: where the state is on its beat or differs from the
@@ -162,7 +141,12 @@ class Apm {
   bool SetUpStates();
   void Observe(int32_t t);
   void PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active);
+  void CatchUpRow(int32_t t, const double* values, double* next_values);
   void Transition(int32_t t, int32_t cur, int32_t next, int32_t active);
+  void ScoreCandidate(int32_t c, int32_t active, double* next_values);
+  void TransitionOneByOne(int32_t cur, int32_t next, int32_t active);
+  int32_t Offset(int32_t state) const;
+  void Relink(int32_t state);
   void SelectBeam(int32_t t, int32_t next);
   void Backtrack();
   int32_t BestFinalState() const;
@@ -177,7 +161,7 @@ class Apm {
   int32_t apmtime_count_ = 0;
   int32_t min_lag_ = 0;
   int32_t max_lag_ = 0;
-  // Ascending.
+  // The on-beat state of every lag, by lag index, then the orphans.
   std::vector<int32_t> candidates_;
   static constexpr double kImpossible = -100000.0;
   static constexpr double kEpsilon = 1e-5;
@@ -214,13 +198,34 @@ class Apm {
   bool ready_ = false;
 
   // Per-frame scratch, sized once.
-  std::vector<int32_t> on_beat_;
   std::vector<int32_t> live_stamp_;
   std::vector<int32_t> candidate_lag_;
   std::vector<int32_t> candidate_offset_;
   std::vector<double> candidate_observation_;
   std::vector<double> candidate_prior_;
+  std::vector<double> entry_base_;
+  std::vector<int32_t> entry_lag_;
+  std::vector<int32_t> entry_offset_;
+  std::vector<double> best_;
+  std::vector<int32_t> best_from_;
+  OnBeatTransition on_beat_transition_;
   BeamSelector selector_;
+  // The candidates of the last value_count_ frames, by frame modulo
+  // value_count_: the states where the rows of the ring differ.
+  std::vector<std::vector<int32_t>> changed_;
+  // The current frame modulo every lag.
+  std::vector<int32_t> frame_phase_;
+  // The states with a given predecessor, as lists linked through the
+  // states: so the states orphaned by the beam are found without a scan.
+  std::vector<int32_t> first_child_;
+  std::vector<int32_t> next_sibling_;
+  std::vector<int32_t> previous_sibling_;
+  std::vector<int32_t> linked_parent_;
+  std::vector<int32_t> parents_;
+  std::vector<char> is_parent_;
+
+  // Tests compare the working tables with a plain implementation's.
+  friend class ApmPeer;
 };
 
 }  // namespace apm

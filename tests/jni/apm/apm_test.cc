@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <memory>
 #include <string>
 #include <tuple>
@@ -11,6 +12,24 @@
 #include <vector>
 
 namespace apm {
+
+// The tracker's working tables after Run.
+class ApmPeer {
+ public:
+  static const std::vector<double>& Values(const Apm& a) {
+    return a.values_.cells;
+  }
+  static const std::vector<int32_t>& Predecessors(const Apm& a) {
+    return a.predecessor_;
+  }
+  static const std::vector<uint16_t>& BeamStates(const Apm& a) {
+    return a.beam_states_.cells;
+  }
+  static const std::vector<uint16_t>& BeamPredecessors(const Apm& a) {
+    return a.beam_predecessors_.cells;
+  }
+};
+
 namespace {
 
 using testing::internal::CaptureStderr;
@@ -153,50 +172,6 @@ TEST(ApmTracking, WrappedOffsetIsTheSignedDistanceToTheNearestBeat) {
   }
 }
 
-TEST(ApmBeam, HeapOrderForEqualValuesAndFullHeaps) {
-  BeamSelector selector;
-  const double equal[] = {0, 0, 0, 0, 0};
-  std::vector<int32_t> beam(5);
-  selector.Select(equal, 4, 4, beam.data());
-  EXPECT_EQ(beam, (std::vector<int32_t>{0, 1, 3, 2, 0}));
-  selector.Select(equal, 5, 5, beam.data());
-  EXPECT_EQ(beam, (std::vector<int32_t>{0, 1, 3, 4, 2}));
-  // Full: a value must exceed the root to get in; the two 5s tie.
-  const double values[] = {3, 1, 4, 1, 5, 9, 2, 6, 5, 3};
-  selector.Select(values, 10, 3, beam.data());
-  EXPECT_EQ(beam, (std::vector<int32_t>{4, 7, 5, 4, 2}));
-}
-
-// Rows drifting from frame to frame like the tracker's, now and then with
-// a tie near the edge of the beam: the shortcut must match the heap.
-TEST(ApmBeam, ShortcutAgreesWithTheHeap) {
-  constexpr int kCount = 400;
-  constexpr int kWidth = 30;
-  uint32_t random = 99;
-  const auto next = [&random] {
-    return (random = random * 1664525u + 1013904223u) >> 8;
-  };
-  std::vector<double> row(kCount);
-  for (double& v : row) v = next() % 100000;
-  BeamSelector fast;
-  BeamSelector heap;
-  std::vector<int32_t> a(kWidth);
-  std::vector<int32_t> b(kWidth);
-  int differing = 0;
-  for (int frame = 0; frame < 3000; ++frame) {
-    for (int i = 0; i < 20; ++i) row[next() % kCount] += next() % 2000 - 1000.0;
-    if (frame % 7 == 0) {
-      std::vector<double> sorted = row;
-      std::sort(sorted.begin(), sorted.end());
-      row[next() % kCount] = sorted[kCount - kWidth - 2 + next() % 4];
-    }
-    fast.Select(row.data(), kCount, kWidth, a.data());
-    heap.SelectByHeap(row.data(), kCount, kWidth, b.data());
-    differing += a != b;
-  }
-  EXPECT_EQ(differing, 0);
-}
-
 TEST(ApmPlacement, BeatsOnTheBeatOrAtChangesAfterTheSpacing) {
   const std::vector<int32_t> frames =
       PlaceBeatFrames(std::vector<int32_t>(200, 0), {50}, {10}, 0.75);
@@ -277,6 +252,216 @@ TEST(ApmRun, BrokenLinkAndSingleFrame) {
   const Tracked one = Track({0.0f, 0.0f, 1.0f});
   EXPECT_EQ(one.tracker->beat_times(), std::vector<double>{0.02});
   EXPECT_EQ(one.tracker->bpm(), 0.0);
+}
+
+template <typename T>
+bool SameBits(const std::vector<T>& a, const std::vector<T>& b) {
+  return a.size() == b.size() &&
+         std::memcmp(a.data(), b.data(), a.size() * sizeof(T)) == 0;
+}
+
+// The tracking pass as plainly as it can be written: every state scanned
+// for orphans, every candidate scored from every beam entry in beam order,
+// the beam taken by the heap, a comb ring of the full depth.
+struct PlainPass {
+  std::vector<double> values;
+  std::vector<int32_t> predecessor;
+  std::vector<uint16_t> beam_states;
+  std::vector<uint16_t> beam_predecessors;
+  std::vector<int32_t> path;
+};
+
+PlainPass RunPlain(const Apm& a, const ApmConfig& config) {
+  constexpr double kImpossible = -100000.0;
+  const int T = a.time_count();
+  const int V = a.value_count();
+  const int N = a.apmtime_count();
+  const int S = a.state_count();
+  const int B = config.beam_width;
+  const int lags = a.lag_count();
+  const std::vector<int32_t>& lag = a.state_lag();
+  const std::vector<int32_t>& phase = a.state_phase();
+  const std::vector<float>& x = a.detection();
+  const double w = config.comb_input_weight;
+  PlainPass p{std::vector<double>(V * S, kImpossible),
+              std::vector<int32_t>(S, -1),
+              std::vector<uint16_t>((T + 1) * B, 0),
+              std::vector<uint16_t>((T + 1) * B, 0), std::vector<int32_t>(T)};
+  std::vector<double> comb(N * lags, kImpossible);
+  std::vector<double> observation(S, kImpossible);
+  std::vector<int32_t> beam(std::max(B, lags));
+  std::copy(a.lag_first_state().begin(), a.lag_first_state().end(),
+            beam.begin());
+  BeamSelector heap;
+  int active = lags;
+  for (int t = 0; t < T; ++t) {
+    double* cur = &p.values[(t % V) * S];
+    double* next = &p.values[((t + 1) % V) * S];
+    for (int i = 0; i < lags; ++i) {
+      const int back = t - (a.min_lag() + i);
+      float product = back >= 0
+                          ? x[back] * x[t]
+                          : static_cast<float>(config.comb_start_factor * x[t]);
+      if (w < 1.0) {
+        const float previous =
+            static_cast<float>(back >= 0 ? std::exp(comb[(back % N) * lags + i])
+                                         : config.comb_start_factor);
+        product = static_cast<float>(previous * (1.0 - w) + w * product);
+      }
+      comb[(t % N) * lags + i] = std::log(product + 1e-5);
+    }
+    std::vector<char> live(S, 0);
+    std::vector<char> on_beat(S, 0);
+    for (int i = 0; i < lags; ++i) {
+      on_beat[a.lag_first_state()[i] + t % (a.min_lag() + i)] = 1;
+    }
+    for (int k = 0; t >= 1 && k < active; ++k) {
+      if (cur[beam[k]] != kImpossible) live[beam[k]] = 1;
+    }
+    std::vector<int> candidates;
+    for (int s = 0; s < S; ++s) {
+      const int from = p.predecessor[s];
+      if (on_beat[s] || (t >= 1 && from != -1 && !live[from])) {
+        candidates.push_back(s);
+      }
+    }
+    if (next != cur) std::copy_n(cur, S, next);
+    for (int c : candidates) next[c] = kImpossible;
+    for (int i = 0; i < lags; ++i) {
+      observation[a.lag_first_state()[i] + t % (a.min_lag() + i)] =
+          comb[(t % N) * lags + i];
+    }
+    for (int k = 0; k < active; ++k) {
+      const int f = beam[k];
+      const double vf = cur[f] == kImpossible ? 0.0 : cur[f];
+      const int df = WrappedOffset(t, lag[f], phase[f]);
+      for (int c : candidates) {
+        const int dc = WrappedOffset(t, lag[c], phase[c]);
+        const double period = a.period_change_score()[std::min(
+            std::abs(lag[c] - lag[f]), config.period_table_size - 1)];
+        const double phase_term = a.phase_deviation_score()[std::min(
+            std::abs(df - dc), config.phase_table_size - 1)];
+        const double score = (config.beat_bonus + vf) +
+                             (((observation[c] + period) + phase_term) +
+                              a.tempo_prior()[lag[c] - a.min_lag()]);
+        if (score > next[c]) {
+          next[c] = score;
+          p.predecessor[c] = f;
+        }
+      }
+    }
+    heap.SelectByHeap(next, S, B, beam.data());
+    for (int k = 0; k < B; ++k) {
+      const int from = p.predecessor[beam[k]];
+      p.beam_states[(t + 1) * B + k] = static_cast<uint16_t>(beam[k]);
+      p.beam_predecessors[(t + 1) * B + k] =
+          static_cast<uint16_t>(from == -1 ? 0xFFFF : from);
+    }
+    active = B;
+  }
+  const double* last = &p.values[(T % V) * S];
+  int s = 0;
+  double best = -10000000.0;
+  for (int i = 0; i < S; ++i) {
+    if (last[i] > best) {
+      best = last[i];
+      s = i;
+    }
+  }
+  for (int t = T; t >= 1; --t) {
+    const uint16_t* states = &p.beam_states[t * B];
+    int k = 0;
+    while (k < B && states[k] != s) ++k;
+    if (k == B) {
+      k = B - 1;
+      if (s == -1) s = states[k];
+    }
+    p.path[t - 1] = s;
+    const uint16_t from = p.beam_predecessors[t * B + k];
+    s = from == 0xFFFF ? -1 : from;
+  }
+  return p;
+}
+
+// Every frame's beam and predecessors, the value rows, the predecessors and
+// the path, bit for bit, over inputs meant to shake out ties, orphans and
+// the fallbacks to scoring one by one.
+TEST(ApmRun, SameTablesAsThePlainPass) {
+  uint32_t random = 5;
+  const auto uniform = [&random] {
+    random = random * 1664525u + 1013904223u;
+    return static_cast<float>(random >> 8) / (1 << 24);
+  };
+  const auto noise = [&](int n) {
+    std::vector<float> x(n);
+    for (float& v : x) v = uniform();
+    return x;
+  };
+  const auto levels = [&](int n) {  // few values, so many equal scores
+    std::vector<float> x(n);
+    for (float& v : x) v = 0.25f * (1 + static_cast<int>(uniform() * 4));
+    return x;
+  };
+  std::vector<float> peaky = noise(1500);
+  for (int t = 0; t < 1500; ++t) {
+    peaky[t] *= 0.2f;
+    // A tempo that drifts, with missing and extra beats.
+    if (t % (45 + t / 300) == 0 && uniform() > 0.1f) peaky[t] = 1.0f;
+    if (uniform() > 0.99f) peaky[t] = 0.9f;
+  }
+  ApmConfig one_row;
+  one_row.value_slot_count = 1;
+  ApmConfig tiny;
+  tiny.min_period_ms = 2.0;
+  tiny.max_period_ms = 4.0;
+  tiny.beam_width = 9;
+  ApmConfig flat;
+  flat.use_tempo_prior = false;
+  flat.comb_input_weight = 1.0;
+  ApmConfig wide;  // long table heads: many near lags, or none grouped
+  wide.transition_sigma_ms = 45.0;
+  ApmConfig wider;
+  wider.transition_sigma_ms = 80.0;
+  ApmConfig no_phase;  // NaN phase scores: no score ever wins
+  no_phase.phase_deviation_weight = -1.0;
+  ApmConfig huge;  // sums that overflow
+  huge.beat_bonus = 1e306;
+  ApmConfig narrow;
+  narrow.beam_width = 3;
+  narrow.period_table_size = 1;
+  narrow.phase_table_size = 2;
+  const std::tuple<std::vector<float>, ApmConfig, int> cases[] = {
+      {noise(1200), ApmConfig(), 100},
+      {peaky, ApmConfig(), 100},
+      {levels(1000), ApmConfig(), 100},
+      {std::vector<float>(400, 0.5f), ApmConfig(), 100},
+      {{1.0f}, ApmConfig(), 100},
+      {{0.3f, 1.0f}, ApmConfig(), 100},
+      {noise(7), ApmConfig(), 100},
+      {noise(90), ApmConfig(), 100},
+      {noise(600), one_row, 100},
+      {levels(300), tiny, 1000},
+      {noise(500), flat, 100},
+      {noise(600), ApmConfig(), 50},
+      {levels(250), ApmConfig(), 200},
+      {noise(250), wide, 100},
+      {noise(250), wider, 100},
+      {noise(200), no_phase, 100},
+      {noise(200), huge, 100},
+      {levels(500), narrow, 100}};
+  int index = 0;
+  for (const auto& [detection, config, fps] : cases) {
+    const Tracked r = Track(detection, config, fps);
+    const Apm& a = *r.tracker;
+    const PlainPass plain = RunPlain(a, config);
+    EXPECT_TRUE(SameBits(ApmPeer::BeamStates(a), plain.beam_states)) << index;
+    EXPECT_TRUE(SameBits(ApmPeer::BeamPredecessors(a), plain.beam_predecessors))
+        << index;
+    EXPECT_TRUE(SameBits(ApmPeer::Values(a), plain.values)) << index;
+    EXPECT_TRUE(SameBits(ApmPeer::Predecessors(a), plain.predecessor)) << index;
+    EXPECT_EQ(a.path(), plain.path) << index;
+    ++index;
+  }
 }
 
 // One ERROR line of the tracker's own, no model, no progress, no beats.

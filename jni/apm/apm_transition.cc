@@ -1,0 +1,266 @@
+#include "jni/apm/apm_transition.h"
+
+#include <algorithm>
+#include <cmath>
+#include <cstdlib>
+#include <cstring>
+#include <limits>
+
+// Why this gives the naive pass's results bit for bit. For a lag j, the
+// score of entry k is fl(base[k] + x), and x only depends on the period
+// term and the phase term. Past a certain difference each table holds one
+// value (the Gaussian underflows against the epsilon), so the entries fall
+// into groups with one x: same lag and same phase class for the lags near
+// j, same phase class for all the far ones. Rounding is monotone, so in a
+// group the largest base gives the largest score, and another member can
+// only tie it if the two bases lie within one ulp of the score, i.e. within
+// delta. Entries with a neighbour that close ("crowded") are always scored;
+// the others only where they have the largest base of their group.
+//
+// Further, the class top with the largest key (base plus phase term), the
+// leader, is scored at every lag. Outside its own near lags, an entry whose
+// key plus its best period gain over the tail is below the leader's key by
+// more than the rounding of the sums (margin) scores strictly less, so it
+// is scored only at the leader's near lags; not even there if no near
+// period term is below the tail's, as the leader then does no worse.
+//
+// Every entry that could be first with the best score is scored, and ties
+// go to the earlier entry, so the result is the naive pass's.
+
+namespace apm {
+namespace {
+
+// Inputs up to this size cannot make a sum of five of them overflow.
+constexpr double kLargest = 1e300;
+// Phase tables whose tail starts later hold a Gaussian so wide that the
+// groups would not save anything.
+constexpr int32_t kMostPhaseClasses = 64;
+
+// The first index from which every entry has the bits of the last one.
+int32_t TailStart(const std::vector<double>& table) {
+  int32_t d = static_cast<int32_t>(table.size()) - 1;
+  while (d > 0 &&
+         std::memcmp(&table[d - 1], &table.back(), sizeof(double)) == 0) {
+    --d;
+  }
+  return d;
+}
+
+bool Bounded(const double* v, size_t n, double* max_abs) {
+  double largest = 0.0;
+  for (size_t i = 0; i < n; ++i) {
+    const double a = std::abs(v[i]);
+    if (!(a <= kLargest)) return false;
+    largest = std::max(largest, a);
+  }
+  *max_abs = largest;
+  return true;
+}
+
+// In any order of offers this keeps the first entry with the largest
+// score, as a pass in beam order with a strict comparison does.
+// Without branches: whether an offer wins is hard to predict.
+inline void Offer(double score, int32_t entry, double* best, int32_t* from) {
+  const bool wins = (score > *best) | ((score == *best) & (entry < *from));
+  *best = wins ? score : *best;
+  *from = wins ? entry : *from;
+}
+
+}  // namespace
+
+void OnBeatTransition::SetUp(int32_t lag_count,
+                             const std::vector<double>& period_change_score,
+                             const std::vector<double>& phase_deviation_score) {
+  lag_count_ = lag_count;
+  period_ = period_change_score;
+  phase_ = phase_deviation_score;
+  usable_ = !period_.empty() && !phase_.empty() &&
+            Bounded(period_.data(), period_.size(), &period_max_abs_) &&
+            Bounded(phase_.data(), phase_.size(), &phase_max_abs_);
+  if (!usable_) return;
+  // Lags never differ by lag_count or more.
+  period_tail_ = std::min(TailStart(period_), lag_count);
+  phase_tail_ = TailStart(phase_);
+  usable_ = phase_tail_ < kMostPhaseClasses;
+  period_gain_ = 0.0;
+  near_at_least_tail_ = true;
+  for (int32_t d = 0; d < period_tail_; ++d) {
+    period_gain_ = std::max(period_gain_, period_[d] - period_.back());
+    near_at_least_tail_ &= period_[d] >= period_.back();
+  }
+  seen_.assign(static_cast<size_t>(lag_count) * (phase_tail_ + 1), 0);
+  generation_ = 0;
+}
+
+bool OnBeatTransition::Score(const double* base, const int32_t* lag,
+                             const int32_t* offset, int32_t count,
+                             const double* observation, const double* prior,
+                             double* best, int32_t* from) {
+  double base_max = 0.0;
+  double observation_max = 0.0;
+  double prior_max = 0.0;
+  if (!usable_ || count < 1 || !Bounded(base, count, &base_max) ||
+      !Bounded(observation, lag_count_, &observation_max) ||
+      !Bounded(prior, lag_count_, &prior_max)) {
+    return false;
+  }
+  // Two sums rounding to the same double s differ by at most ulp(s), which
+  // is at most 2^-52 |s| or the smallest subnormal; |s| is below this bound
+  // plus a little rounding. Four times that leaves room for the rounding
+  // of the differences compared with it. A score is off the exact sum of
+  // its five terms by three roundings, keys and gains by a few more: the
+  // margin covers them all many times over.
+  const double bound =
+      base_max + observation_max + period_max_abs_ + phase_max_abs_ + prior_max;
+  delta_ =
+      std::ldexp(bound, -50) + 16 * std::numeric_limits<double>::denorm_min();
+  margin_ =
+      std::ldexp(bound, -46) + 16 * std::numeric_limits<double>::denorm_min();
+  Order(base, lag, offset, count);
+  Keep();
+  FindLeader();
+  std::fill_n(best, lag_count_, -std::numeric_limits<double>::infinity());
+  std::fill_n(from, lag_count_, count);
+  ScoreNear(observation, prior, best, from);
+  ScoreFar(observation, prior, best, from);
+  return true;
+}
+
+// Entries by descending base. The beam comes out of the selection in
+// ascending order of value, so this is usually a reversal.
+void OnBeatTransition::Order(const double* base, const int32_t* lag,
+                             const int32_t* offset, int32_t count) {
+  order_.resize(count);
+  bool ascending = true;
+  for (int32_t k = 0; k < count; ++k) {
+    order_[k] = count - 1 - k;
+    ascending &= k == 0 || base[k - 1] <= base[k];
+  }
+  if (!ascending) {
+    std::sort(order_.begin(), order_.end(),
+              [base](int32_t a, int32_t b) { return base[a] > base[b]; });
+  }
+  sorted_.resize(count);
+  for (int32_t i = 0; i < count; ++i) {
+    const int32_t e = order_[i];
+    sorted_[i] = {base[e], lag[e], offset[e], e};
+  }
+}
+
+void OnBeatTransition::Keep() {
+  if (++generation_ == 0) {
+    std::fill(seen_.begin(), seen_.end(), 0);
+    generation_ = 1;
+  }
+  const int32_t count = static_cast<int32_t>(sorted_.size());
+  if (kept_.size() < sorted_.size()) kept_.resize(sorted_.size());
+  const int32_t class_count = phase_tail_ + 1;
+  class_start_.assign(class_count + 1, 0);
+  int32_t kept = 0;
+  for (int32_t i = 0; i < count; ++i) {
+    const Entry& e = sorted_[i];
+    const bool crowded =
+        (i > 0 && sorted_[i - 1].base - e.base <= delta_) |
+        (i + 1 < count && e.base - sorted_[i + 1].base <= delta_);
+    const int32_t phase_class = std::min(std::abs(e.offset), phase_tail_);
+    uint32_t& seen =
+        seen_[static_cast<size_t>(e.lag) * class_count + phase_class];
+    const bool first = seen != generation_;
+    seen = generation_;
+    // Written in any case, counted only when kept: fewer branches.
+    kept_[kept] = {e.base, e.lag, phase_class, e.entry, crowded};
+    class_start_[phase_class + 1] += first | crowded;
+    kept += first | crowded;
+  }
+  kept_count_ = kept;
+  // Kept entries by class, keeping their order within a class.
+  for (int32_t q = 0; q < class_count; ++q) {
+    class_start_[q + 1] += class_start_[q];
+  }
+  by_class_.resize(kept);
+  fill_.assign(class_start_.begin(), class_start_.end() - 1);
+  for (int32_t i = 0; i < kept; ++i) {
+    by_class_[fill_[kept_[i].phase_class]++] = i;
+  }
+}
+
+void OnBeatTransition::FindLeader() {
+  lead_ = -std::numeric_limits<double>::infinity();
+  for (size_t q = 0; q + 1 < class_start_.size(); ++q) {
+    if (class_start_[q] == class_start_[q + 1]) continue;
+    const Kept& top = kept_[by_class_[class_start_[q]]];
+    if (top.base + phase_[q] > lead_) {
+      lead_ = top.base + phase_[q];
+      lead_lag_ = top.lag;
+    }
+  }
+}
+
+// Narrows first .. last to the leader's near lags when the key cannot
+// reach the leader's, or to nothing when the leader does no worse at its
+// near lags than at the far ones.
+void OnBeatTransition::Limit(double key, int32_t* first, int32_t* last) const {
+  if (key < lead_ - margin_) {
+    *first = std::max(*first, lead_lag_ - period_tail_ + 1);
+    *last = std::min(*last, lead_lag_ + period_tail_ - 1);
+    if (near_at_least_tail_) *last = *first - 1;
+  }
+}
+
+// The lags closer to an entry's own than the period table's tail.
+void OnBeatTransition::ScoreNear(const double* observation, const double* prior,
+                                 double* best, int32_t* from) const {
+  for (int32_t i = 0; i < kept_count_; ++i) {
+    const Kept& k = kept_[i];
+    const double phase = phase_[k.phase_class];
+    int32_t first = std::max(0, k.lag - period_tail_ + 1);
+    int32_t last = std::min(lag_count_ - 1, k.lag + period_tail_ - 1);
+    Limit(k.base + phase + period_gain_, &first, &last);
+    for (int32_t j = first; j <= last; ++j) {
+      const double score =
+          k.base + (((observation[j] + period_[std::abs(j - k.lag)]) + phase) +
+                    prior[j]);
+      Offer(score, k.entry, &best[j], &from[j]);
+    }
+  }
+}
+
+// All far entries of a phase class share one x; the first of them in the
+// class's list has the largest base.
+void OnBeatTransition::ScoreFar(const double* observation, const double* prior,
+                                double* best, int32_t* from) const {
+  const double tail = period_.back();
+  for (size_t q = 0; q + 1 < class_start_.size(); ++q) {
+    const int32_t* members = by_class_.data() + class_start_[q];
+    const int32_t size = class_start_[q + 1] - class_start_[q];
+    if (size == 0) continue;
+    const double phase = phase_[q];
+    const Kept& top = kept_[members[0]];
+    int32_t first = 0;
+    int32_t last = lag_count_ - 1;
+    Limit(top.base + phase, &first, &last);
+    for (int32_t j = first; j <= last; ++j) {
+      // Most lags are far from the class's top entry.
+      int32_t i = 0;
+      if (std::abs(top.lag - j) < period_tail_) {
+        for (i = 1;
+             i < size && std::abs(kept_[members[i]].lag - j) < period_tail_;
+             ++i) {
+        }
+        if (i == size) continue;
+      }
+      const double x = ((observation[j] + tail) + phase) + prior[j];
+      const Kept& head = kept_[members[i]];
+      Offer(head.base + x, head.entry, &best[j], &from[j]);
+      if (!head.crowded) continue;
+      for (++i; i < size && head.base - kept_[members[i]].base <= delta_; ++i) {
+        const Kept& k = kept_[members[i]];
+        if (std::abs(k.lag - j) >= period_tail_) {
+          Offer(k.base + x, k.entry, &best[j], &from[j]);
+        }
+      }
+    }
+  }
+}
+
+}  // namespace apm

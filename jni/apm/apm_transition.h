@@ -1,0 +1,98 @@
+// The transition step for the states whose beat falls on the current frame,
+// one per lag. Done naively it scores every beam entry against every lag;
+// almost all of those scores differ only in the entry's own value, so a few
+// representatives per frame give the same maxima and the same winners.
+#ifndef CLIPWEAVER_JNI_APM_APM_TRANSITION_H_
+#define CLIPWEAVER_JNI_APM_APM_TRANSITION_H_
+
+#include <cstdint>
+#include <vector>
+
+namespace apm {
+
+class OnBeatTransition {
+ public:
+  // Lags are given as indices 0 .. lag_count - 1 of a grid with a step of
+  // one frame; the tables are indexed by differences of lags and of phase
+  // offsets, the last entry serving every larger difference.
+  void SetUp(int32_t lag_count, const std::vector<double>& period_change_score,
+             const std::vector<double>& phase_deviation_score);
+
+  // Beam entry k (in beam order) has the base score base[k] (beat bonus
+  // plus its value), the lag index lag[k] and the phase offset offset[k].
+  // For every lag index j, best[j] becomes the largest
+  //   base[k] + (((observation[j] + period term) + phase term) + prior[j]),
+  // period term = period_change_score[min(|j - lag[k]|, size - 1)],
+  // phase term = phase_deviation_score[min(|offset[k]|, size - 1)],
+  // and from[j] the first k that reaches it. Returns false, writing
+  // nothing, when an input is not finite or large enough for the sums to
+  // overflow; the caller then has to score naively.
+  bool Score(const double* base, const int32_t* lag, const int32_t* offset,
+             int32_t count, const double* observation, const double* prior,
+             double* best, int32_t* from);
+
+ private:
+  struct Entry {
+    double base;
+    int32_t lag;
+    int32_t offset;
+    int32_t entry;
+  };
+  // Beam entries that can win for some lag, largest base first.
+  struct Kept {
+    double base;
+    int32_t lag;
+    int32_t phase_class;
+    int32_t entry;
+    bool crowded;
+  };
+
+  void Order(const double* base, const int32_t* lag, const int32_t* offset,
+             int32_t count);
+  void Keep();
+  void FindLeader();
+  void Limit(double key, int32_t* first, int32_t* last) const;
+  void ScoreNear(const double* observation, const double* prior, double* best,
+                 int32_t* from) const;
+  void ScoreFar(const double* observation, const double* prior, double* best,
+                int32_t* from) const;
+
+  int32_t lag_count_ = 0;
+  std::vector<double> period_;
+  std::vector<double> phase_;
+  // From these differences on, every table entry has the same bits.
+  int32_t period_tail_ = 0;
+  int32_t phase_tail_ = 0;
+  double period_max_abs_ = 0.0;
+  double phase_max_abs_ = 0.0;
+  // The most a near lag's period term exceeds the tail's, and whether none
+  // falls below it.
+  double period_gain_ = 0.0;
+  bool near_at_least_tail_ = false;
+  bool usable_ = false;
+
+  // Per call: how close two bases must be to possibly tie, how much the
+  // rounding of a score can change comparisons of keys, and the leader.
+  double delta_ = 0.0;
+  double margin_ = 0.0;
+  double lead_ = 0.0;
+  int32_t lead_lag_ = 0;
+
+  std::vector<int32_t> order_;
+  // The entries by descending base.
+  std::vector<Entry> sorted_;
+  std::vector<Kept> kept_;
+  int32_t kept_count_ = 0;
+  // Positions in kept_ by phase class, largest base first within a class;
+  // class q takes by_class_[class_start_[q] .. class_start_[q + 1]).
+  std::vector<int32_t> by_class_;
+  std::vector<int32_t> class_start_;
+  std::vector<int32_t> fill_;
+  // Stamps of the (lag, phase class) groups already met in this call.
+  std::vector<uint32_t> seen_;
+  uint32_t generation_ = 0;
+};
+
+}  // namespace apm
+
+#endif  // CLIPWEAVER_JNI_APM_APM_TRANSITION_H_
