@@ -183,8 +183,8 @@ bool Apm::SetUpStates() {
   entry_offset_.assign(beam_.size(), 0);
   best_.assign(lag_count_, 0.0);
   best_from_.assign(lag_count_, 0);
-  on_beat_transition_.SetUp(lag_count_, period_change_score_,
-                            phase_deviation_score_);
+  transition_.SetUp(lag_count_, max_lag_, period_change_score_,
+                    phase_deviation_score_);
   frame_phase_.assign(lag_count_, 0);
   changed_.assign(value_count_, {});
   first_child_.assign(state_count_, -1);
@@ -324,12 +324,13 @@ void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
       entry_lag_[k] = state_lag_[f] - min_lag_;
       entry_offset_[k] = Offset(f);
     }
+    const BeamEntries entries{entry_base_.data(), entry_lag_.data(),
+                              entry_offset_.data(), active};
     double* next_values = values_.row(next);
     size_t first = 0;
-    if (on_beat_transition_.Score(
-            entry_base_.data(), entry_lag_.data(), entry_offset_.data(), active,
-            comb_.row(t % comb_rows_), tempo_prior_.data(), best_.data(),
-            best_from_.data())) {
+    if (transition_.ScoreOnBeat(entries, comb_.row(t % comb_rows_),
+                                tempo_prior_.data(), best_.data(),
+                                best_from_.data())) {
       for (int32_t j = 0; j < lag_count_; ++j) {
         const int32_t c = candidates_[j];
         if (best_[j] > next_values[c]) {
@@ -339,41 +340,18 @@ void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
       }
       first = lag_count_;
     }
+    // The others one at a time, as the pass over all candidates would.
     for (size_t i = first; i < candidates_.size(); ++i) {
-      ScoreCandidate(candidates_[i], active, next_values);
+      const int32_t c = candidates_[i];
+      const int32_t lag = state_lag_[c] - min_lag_;
+      int32_t from = -1;
+      transition_.ScoreState(entries, lag, Offset(c), observation_[c],
+                             tempo_prior_[lag], &next_values[c], &from);
+      if (from != -1) predecessor_[c] = beam_[from];
     }
   }
   for (int32_t c : candidates_) {
     if (predecessor_[c] != linked_parent_[c]) Relink(c);
-  }
-}
-
-// One candidate from the gathered beam entries: what the pass over all
-// candidates does for it when the rows are apart.
-void Apm::ScoreCandidate(int32_t c, int32_t active, double* next_values) {
-  const int32_t lag = state_lag_[c] - min_lag_;
-  const int32_t offset = Offset(c);
-  const double observation = observation_[c];
-  const double prior = tempo_prior_[lag];
-  const int32_t last_period = config_.period_table_size - 1;
-  const int32_t last_phase = config_.phase_table_size - 1;
-  double best = next_values[c];
-  int32_t from = -1;
-  for (int32_t k = 0; k < active; ++k) {
-    const double period = period_change_score_[std::min(
-        std::abs(lag - entry_lag_[k]), last_period)];
-    const double phase = phase_deviation_score_[std::min(
-        std::abs(entry_offset_[k] - offset), last_phase)];
-    const double score =
-        entry_base_[k] + (((observation + period) + phase) + prior);
-    if (score > best) {
-      best = score;
-      from = k;
-    }
-  }
-  if (from != -1) {
-    next_values[c] = best;
-    predecessor_[c] = beam_[from];
   }
 }
 
@@ -382,6 +360,28 @@ int32_t Apm::Offset(int32_t state) const {
   const int32_t lag = state_lag_[state];
   return WrappedPhaseOffset(frame_phase_[lag - min_lag_], lag,
                             state_phase_[state]);
+}
+
+// The first state with the largest value after the last frame.
+int32_t Apm::BestFinalState() const {
+  const double* last = values_.row(time_count_ % value_count_);
+  int32_t state = 0;
+  double best = -10000000.0;
+  for (int32_t s = 0; s < state_count_; ++s) {
+    if (last[s] > best) {
+      best = last[s];
+      state = s;
+    }
+  }
+  return state;
+}
+
+void Apm::PlaceBeats() {
+  beat_times_ =
+      BeatFramesToSeconds(PlaceBeatFrames(path_, state_lag_, state_phase_,
+                                          config_.min_beat_spacing),
+                          leading_trimmed_, frames_per_second_);
+  bpm_ = MedianTempo(beat_times_);
 }
 
 // Row t of the beam tables holds the beam after frame t - 1, so it names
@@ -403,20 +403,6 @@ void Apm::Backtrack() {
     const uint16_t predecessor = beam_predecessors_.row(t)[k];
     s = predecessor == kNoPredecessor ? -1 : predecessor;
   }
-}
-
-// The first state with the largest value after the last frame.
-int32_t Apm::BestFinalState() const {
-  const double* last = values_.row(time_count_ % value_count_);
-  int32_t state = 0;
-  double best = -10000000.0;
-  for (int32_t s = 0; s < state_count_; ++s) {
-    if (last[s] > best) {
-      best = last[s];
-      state = s;
-    }
-  }
-  return state;
 }
 
 // Scores every candidate from every beam entry in turn. The per-candidate
@@ -478,14 +464,6 @@ void Apm::Relink(int32_t state) {
     is_parent_[parent] = 1;
     parents_.push_back(parent);
   }
-}
-
-void Apm::PlaceBeats() {
-  beat_times_ =
-      BeatFramesToSeconds(PlaceBeatFrames(path_, state_lag_, state_phase_,
-                                          config_.min_beat_spacing),
-                          leading_trimmed_, frames_per_second_);
-  bpm_ = MedianTempo(beat_times_);
 }
 
 int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase) {

@@ -143,7 +143,6 @@ class Apm {
   void PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active);
   void CatchUpRow(int32_t t, const double* values, double* next_values);
   void Transition(int32_t t, int32_t cur, int32_t next, int32_t active);
-  void ScoreCandidate(int32_t c, int32_t active, double* next_values);
   void TransitionOneByOne(int32_t cur, int32_t next, int32_t active);
   int32_t Offset(int32_t state) const;
   void Relink(int32_t state);
@@ -208,7 +207,7 @@ class Apm {
   std::vector<int32_t> entry_offset_;
   std::vector<double> best_;
   std::vector<int32_t> best_from_;
-  OnBeatTransition on_beat_transition_;
+  TransitionScorer transition_;
   BeamSelector selector_;
   // The candidates of the last value_count_ frames, by frame modulo
   // value_count_: the states where the rows of the ring differ.

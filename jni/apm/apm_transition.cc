@@ -6,8 +6,8 @@
 #include <cstring>
 #include <limits>
 
-// Why this gives the naive pass's results bit for bit. For a lag j, the
-// score of entry k is fl(base[k] + x), and x only depends on the period
+// Why ScoreOnBeat gives the naive pass's results bit for bit. For a lag j,
+// the score of entry k is fl(base[k] + x), and x only depends on the period
 // term and the phase term. Past a certain difference each table holds one
 // value (the Gaussian underflows against the epsilon), so the entries fall
 // into groups with one x: same lag and same phase class for the lags near
@@ -66,14 +66,26 @@ inline void Offer(double score, int32_t entry, double* best, int32_t* from) {
   *from = wins ? entry : *from;
 }
 
+std::vector<double> ByDifference(const std::vector<double>& table,
+                                 int32_t largest) {
+  std::vector<double> terms(2 * largest + 1);
+  for (int32_t d = -largest; d <= largest; ++d) {
+    terms[d + largest] = table[std::min<size_t>(std::abs(d), table.size() - 1)];
+  }
+  return terms;
+}
+
 }  // namespace
 
-void OnBeatTransition::SetUp(int32_t lag_count,
+void TransitionScorer::SetUp(int32_t lag_count, int32_t offset_range,
                              const std::vector<double>& period_change_score,
                              const std::vector<double>& phase_deviation_score) {
   lag_count_ = lag_count;
+  offset_range_ = offset_range;
   period_ = period_change_score;
   phase_ = phase_deviation_score;
+  period_by_difference_ = ByDifference(period_, lag_count - 1);
+  phase_by_difference_ = ByDifference(phase_, offset_range);
   usable_ = !period_.empty() && !phase_.empty() &&
             Bounded(period_.data(), period_.size(), &period_max_abs_) &&
             Bounded(phase_.data(), phase_.size(), &phase_max_abs_);
@@ -92,14 +104,15 @@ void OnBeatTransition::SetUp(int32_t lag_count,
   generation_ = 0;
 }
 
-bool OnBeatTransition::Score(const double* base, const int32_t* lag,
-                             const int32_t* offset, int32_t count,
-                             const double* observation, const double* prior,
-                             double* best, int32_t* from) {
+bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
+                                   const double* observation,
+                                   const double* prior, double* best,
+                                   int32_t* from) {
   double base_max = 0.0;
   double observation_max = 0.0;
   double prior_max = 0.0;
-  if (!usable_ || count < 1 || !Bounded(base, count, &base_max) ||
+  if (!usable_ || entries.count < 1 ||
+      !Bounded(entries.base, entries.count, &base_max) ||
       !Bounded(observation, lag_count_, &observation_max) ||
       !Bounded(prior, lag_count_, &prior_max)) {
     return false;
@@ -116,20 +129,44 @@ bool OnBeatTransition::Score(const double* base, const int32_t* lag,
       std::ldexp(bound, -50) + 16 * std::numeric_limits<double>::denorm_min();
   margin_ =
       std::ldexp(bound, -46) + 16 * std::numeric_limits<double>::denorm_min();
-  Order(base, lag, offset, count);
+  Order(entries);
   Keep();
   FindLeader();
   std::fill_n(best, lag_count_, -std::numeric_limits<double>::infinity());
-  std::fill_n(from, lag_count_, count);
+  std::fill_n(from, lag_count_, entries.count);
   ScoreNear(observation, prior, best, from);
   ScoreFar(observation, prior, best, from);
   return true;
 }
 
+void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
+                                  int32_t offset, double observation,
+                                  double prior, double* best,
+                                  int32_t* from) const {
+  // Looked up by signed difference: the loop neither folds nor clips.
+  const double* period = period_by_difference_.data() + lag_count_ - 1 - lag;
+  const double* phase = phase_by_difference_.data() + offset_range_ - offset;
+  double top = *best;
+  int32_t top_from = *from;
+  for (int32_t k = 0; k < entries.count; ++k) {
+    const double score =
+        entries.base[k] +
+        (((observation + period[entries.lag[k]]) + phase[entries.offset[k]]) +
+         prior);
+    if (score > top) {
+      top = score;
+      top_from = k;
+    }
+  }
+  *best = top;
+  *from = top_from;
+}
+
 // Entries by descending base. The beam comes out of the selection in
 // ascending order of value, so this is usually a reversal.
-void OnBeatTransition::Order(const double* base, const int32_t* lag,
-                             const int32_t* offset, int32_t count) {
+void TransitionScorer::Order(const BeamEntries& entries) {
+  const int32_t count = entries.count;
+  const double* base = entries.base;
   order_.resize(count);
   bool ascending = true;
   for (int32_t k = 0; k < count; ++k) {
@@ -143,11 +180,11 @@ void OnBeatTransition::Order(const double* base, const int32_t* lag,
   sorted_.resize(count);
   for (int32_t i = 0; i < count; ++i) {
     const int32_t e = order_[i];
-    sorted_[i] = {base[e], lag[e], offset[e], e};
+    sorted_[i] = {base[e], entries.lag[e], entries.offset[e], e};
   }
 }
 
-void OnBeatTransition::Keep() {
+void TransitionScorer::Keep() {
   if (++generation_ == 0) {
     std::fill(seen_.begin(), seen_.end(), 0);
     generation_ = 1;
@@ -184,7 +221,7 @@ void OnBeatTransition::Keep() {
   }
 }
 
-void OnBeatTransition::FindLeader() {
+void TransitionScorer::FindLeader() {
   lead_ = -std::numeric_limits<double>::infinity();
   for (size_t q = 0; q + 1 < class_start_.size(); ++q) {
     if (class_start_[q] == class_start_[q + 1]) continue;
@@ -199,7 +236,7 @@ void OnBeatTransition::FindLeader() {
 // Narrows first .. last to the leader's near lags when the key cannot
 // reach the leader's, or to nothing when the leader does no worse at its
 // near lags than at the far ones.
-void OnBeatTransition::Limit(double key, int32_t* first, int32_t* last) const {
+void TransitionScorer::Limit(double key, int32_t* first, int32_t* last) const {
   if (key < lead_ - margin_) {
     *first = std::max(*first, lead_lag_ - period_tail_ + 1);
     *last = std::min(*last, lead_lag_ + period_tail_ - 1);
@@ -208,7 +245,7 @@ void OnBeatTransition::Limit(double key, int32_t* first, int32_t* last) const {
 }
 
 // The lags closer to an entry's own than the period table's tail.
-void OnBeatTransition::ScoreNear(const double* observation, const double* prior,
+void TransitionScorer::ScoreNear(const double* observation, const double* prior,
                                  double* best, int32_t* from) const {
   for (int32_t i = 0; i < kept_count_; ++i) {
     const Kept& k = kept_[i];
@@ -227,7 +264,7 @@ void OnBeatTransition::ScoreNear(const double* observation, const double* prior,
 
 // All far entries of a phase class share one x; the first of them in the
 // class's list has the largest base.
-void OnBeatTransition::ScoreFar(const double* observation, const double* prior,
+void TransitionScorer::ScoreFar(const double* observation, const double* prior,
                                 double* best, int32_t* from) const {
   const double tail = period_.back();
   for (size_t q = 0; q + 1 < class_start_.size(); ++q) {

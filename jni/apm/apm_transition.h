@@ -1,7 +1,8 @@
-// The transition step for the states whose beat falls on the current frame,
-// one per lag. Done naively it scores every beam entry against every lag;
-// almost all of those scores differ only in the entry's own value, so a few
-// representatives per frame give the same maxima and the same winners.
+// The transition step of the tracker: the best predecessor in the beam of
+// every state to re-score. Done naively, every beam entry is scored against
+// every lag's on-beat state; almost all of those scores differ only in the
+// entry's own value, so a few representatives per frame give the same
+// maxima and the same winners.
 #ifndef CLIPWEAVER_JNI_APM_APM_TRANSITION_H_
 #define CLIPWEAVER_JNI_APM_APM_TRANSITION_H_
 
@@ -10,26 +11,42 @@
 
 namespace apm {
 
-class OnBeatTransition {
+// The beam of a frame, entry k in beam order: its base score (beat bonus
+// plus its value), lag index and phase offset.
+struct BeamEntries {
+  const double* base;
+  const int32_t* lag;
+  const int32_t* offset;
+  int32_t count;
+};
+
+class TransitionScorer {
  public:
   // Lags are given as indices 0 .. lag_count - 1 of a grid with a step of
-  // one frame; the tables are indexed by differences of lags and of phase
-  // offsets, the last entry serving every larger difference.
-  void SetUp(int32_t lag_count, const std::vector<double>& period_change_score,
+  // one frame, and phase offsets differ by offset_range at most. The tables
+  // are indexed by differences of lags and of phase offsets, the last
+  // entry serving every larger difference.
+  void SetUp(int32_t lag_count, int32_t offset_range,
+             const std::vector<double>& period_change_score,
              const std::vector<double>& phase_deviation_score);
 
-  // Beam entry k (in beam order) has the base score base[k] (beat bonus
-  // plus its value), the lag index lag[k] and the phase offset offset[k].
   // For every lag index j, best[j] becomes the largest
   //   base[k] + (((observation[j] + period term) + phase term) + prior[j]),
   // period term = period_change_score[min(|j - lag[k]|, size - 1)],
   // phase term = phase_deviation_score[min(|offset[k]|, size - 1)],
-  // and from[j] the first k that reaches it. Returns false, writing
-  // nothing, when an input is not finite or large enough for the sums to
-  // overflow; the caller then has to score naively.
-  bool Score(const double* base, const int32_t* lag, const int32_t* offset,
-             int32_t count, const double* observation, const double* prior,
-             double* best, int32_t* from);
+  // and from[j] the first k that reaches it: the on-beat state of every
+  // lag. Returns false, writing nothing, when an input is not finite or
+  // large enough for the sums to overflow; the caller then has to score
+  // with ScoreState.
+  bool ScoreOnBeat(const BeamEntries& entries, const double* observation,
+                   const double* prior, double* best, int32_t* from);
+
+  // One state of lag index lag and phase offset offset, entry by entry in
+  // beam order: each score above *best replaces it, and its entry goes to
+  // *from.
+  void ScoreState(const BeamEntries& entries, int32_t lag, int32_t offset,
+                  double observation, double prior, double* best,
+                  int32_t* from) const;
 
  private:
   struct Entry {
@@ -47,8 +64,7 @@ class OnBeatTransition {
     bool crowded;
   };
 
-  void Order(const double* base, const int32_t* lag, const int32_t* offset,
-             int32_t count);
+  void Order(const BeamEntries& entries);
   void Keep();
   void FindLeader();
   void Limit(double key, int32_t* first, int32_t* last) const;
@@ -60,6 +76,11 @@ class OnBeatTransition {
   int32_t lag_count_ = 0;
   std::vector<double> period_;
   std::vector<double> phase_;
+  // The tables by signed difference, from -(lag_count - 1) and from
+  // -offset_range.
+  std::vector<double> period_by_difference_;
+  std::vector<double> phase_by_difference_;
+  int32_t offset_range_ = 0;
   // From these differences on, every table entry has the same bits.
   int32_t period_tail_ = 0;
   int32_t phase_tail_ = 0;

@@ -105,17 +105,17 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEveryEntry) {
       observation[j] = round % 2 ? 4.0 + next(3) : next(1600) / 100.0;
       prior[j] = round % 4 == 1 ? 0.0 : -(next(300) / 100.0);
     }
-    OnBeatTransition grouped;
-    grouped.SetUp(lags, t[0], t[1]);
+    TransitionScorer grouped;
+    grouped.SetUp(lags, 6, t[0], t[1]);
     std::vector<double> best(lags);
     std::vector<int32_t> from(lags);
     std::vector<double> expected_best;
     std::vector<int32_t> expected_from;
     ScoreEveryEntry(t[0], t[1], base, lag, offset, observation, prior,
                     &expected_best, &expected_from);
-    if (!grouped.Score(base.data(), lag.data(), offset.data(), count,
-                       observation.data(), prior.data(), best.data(),
-                       from.data())) {
+    const BeamEntries entries{base.data(), lag.data(), offset.data(), count};
+    if (!grouped.ScoreOnBeat(entries, observation.data(), prior.data(),
+                             best.data(), from.data())) {
       ++fallbacks;
       continue;
     }
@@ -127,8 +127,8 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEveryEntry) {
   EXPECT_EQ(fallbacks, 0);
 
   // Not finite, or large enough to overflow: left to the caller.
-  OnBeatTransition grouped;
-  grouped.SetUp(3, {-1.0}, {-1.0});
+  TransitionScorer grouped;
+  grouped.SetUp(3, 0, {-1.0}, {-1.0});
   const int32_t lag[] = {0};
   const int32_t offset[] = {0};
   const double observation[] = {0.0, 0.0, 0.0};
@@ -136,13 +136,13 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEveryEntry) {
   int32_t from[3];
   for (double base :
        {std::nan(""), std::numeric_limits<double>::infinity(), 1e301}) {
-    EXPECT_FALSE(grouped.Score(&base, lag, offset, 1, observation, observation,
-                               best, from));
+    EXPECT_FALSE(grouped.ScoreOnBeat({&base, lag, offset, 1}, observation,
+                                     observation, best, from));
   }
-  grouped.SetUp(3, {-1.0, std::nan("")}, {-1.0});
+  grouped.SetUp(3, 0, {-1.0, std::nan("")}, {-1.0});
   const double base = 0.0;
-  EXPECT_FALSE(grouped.Score(&base, lag, offset, 1, observation, observation,
-                             best, from));
+  EXPECT_FALSE(grouped.ScoreOnBeat({&base, lag, offset, 1}, observation,
+                                   observation, best, from));
 }
 
 }  // namespace
