@@ -35,3 +35,13 @@ write("beat_analysis_fuzzer", "cancel_onsets", struct.pack("<iBB", 8000, 1, 33) 
 for window, step in [(10, 5), (1, 1), (40, 100), (127, 3)]:
     write("spectrogram_fuzzer", f"w{window}_s{step}",
           bytes([window & 0xFF, step & 0xFF, 7, 1]) + pulse(2000, 0.5, 1, 0.1))
+
+# Selection: first, last, nth, order bytes, then float32 values.
+write("selection_fuzzer", "small", bytes([0, 4, 2, 1]) + struct.pack("<5f", 5, 1, 4, 2, 3))
+write("selection_fuzzer", "descending", bytes([1, 9, 3, 0x80]) + struct.pack("<12f", *range(12)))
+
+# Resampler: depth, channels, rate (big-endian), stereo flag, then calls.
+for channels, rate, stereo in [(1, 48000, 0), (2, 44100, 0), (1, 48000, 1)]:
+    calls = bytes([1]) + struct.pack(">i", 44100) + bytes([3]) + struct.pack(">H", 441) + bytes(882 * channels)
+    calls += bytes([0]) + struct.pack(">ff", 0.5, 2.0) + bytes([3]) + struct.pack(">H", 100) + bytes(200 * channels)
+    write("resampler_fuzzer", f"c{channels}_s{stereo}", bytes([0, channels]) + struct.pack(">i", rate) + bytes([stereo]) + calls)

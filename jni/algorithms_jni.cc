@@ -1,9 +1,9 @@
 // JNI bridge of com.quilby.norvane.apps.clipweaver.aggregator.Algorithms.
 #include <jni.h>
 
-#include <algorithm>
-#include <functional>
 #include <string>
+
+#include "jni/select_nth.h"
 
 namespace {
 
@@ -35,12 +35,7 @@ Java_com_quilby_norvane_apps_clipweaver_aggregator_Algorithms_nthElement(
   }
   jfloat* elements = env->GetFloatArrayElements(values, nullptr);
   if (elements == nullptr) return 0.0f;
-  if (ascending > 0) {
-    std::nth_element(elements + first, elements + nth, elements + last);
-  } else {
-    std::nth_element(elements + first, elements + nth, elements + last, std::greater<jfloat>());
-  }
-  const jfloat value = elements[nth];
+  const jfloat value = SelectNth(elements, first, nth, last, ascending);
   // The reordering is scratch work, never meant for the caller's array.
   env->ReleaseFloatArrayElements(values, elements, JNI_ABORT);
   return value;
