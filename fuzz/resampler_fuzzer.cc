@@ -61,7 +61,8 @@ extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
         const size_t frames = in.Next(2) % 4096;
         const size_t input_samples = frames * (channels > 0 ? channels : 1);
         const uint64_t output_samples = resampler->getOutputSampleCount(frames);
-        if (output_samples > (1u << 24)) abort();
+        // Extreme upsampling asks for more room than is worth giving.
+        if (output_samples > (1u << 24)) break;
         auto* input = static_cast<int16_t*>(malloc(input_samples * 2 + 1));
         auto* output = static_cast<int16_t*>(malloc(output_samples * 2 + 1));
         for (size_t i = 0; i < input_samples; ++i) input[i] = static_cast<int16_t>(in.Next(2));
