@@ -5,16 +5,12 @@ import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertNotEquals;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 
-import java.io.File;
+import com.quilby.norvane.apps.clipweaver.testing.ChildJvm;
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
-import java.nio.charset.StandardCharsets;
-import java.nio.file.Files;
 import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.List;
-import java.util.concurrent.TimeUnit;
-import java.util.function.Consumer;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
@@ -308,34 +304,12 @@ public class AudioResamplerTest {
     }
   }
 
-  // Native lines go to the process's stderr, which only a parent process can
-  // read. Line numbers are left out of the returned lines.
+  // Line numbers are left out of the returned lines.
   private static List<String> runChild(Class<?> mainClass) throws Exception {
-    List<String> command = new ArrayList<>();
-    command.add(System.getProperty("java.home") + File.separator + "bin" + File.separator + "java");
-    command.add("-Djava.library.path=" + System.getProperty("java.library.path"));
-    command.add("-cp");
-    command.add(System.getProperty("clipweaver.classpath", System.getProperty("java.class.path")));
-    command.add(mainClass.getName());
-    File err = File.createTempFile("resampler", ".err");
-    try {
-      Process process =
-          new ProcessBuilder(command)
-              .redirectInput(ProcessBuilder.Redirect.from(new File("/dev/null")))
-              .redirectOutput(ProcessBuilder.Redirect.DISCARD)
-              .redirectError(err)
-              .start();
-      if (!process.waitFor(120, TimeUnit.SECONDS)) {
-        process.destroyForcibly();
-        throw new AssertionError("child JVM timed out");
-      }
-      assertEquals(0, process.exitValue());
-      List<String> lines = new ArrayList<>();
-      Consumer<String> keep = line -> lines.add(line.replaceFirst("\\.cc:[0-9]+ ", ".cc: "));
-      Files.readString(err.toPath(), StandardCharsets.UTF_8).lines().forEach(keep);
-      return lines;
-    } finally {
-      err.delete();
-    }
+    ChildJvm child = ChildJvm.run(mainClass);
+    assertEquals(0, child.exitCode, child.stderr);
+    List<String> lines = new ArrayList<>();
+    child.stderr.lines().forEach(line -> lines.add(line.replaceFirst("\\.cc:[0-9]+ ", ".cc: ")));
+    return lines;
   }
 }

@@ -5,6 +5,7 @@ import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 import static org.junit.jupiter.api.Assertions.assertTrue;
 
+import com.quilby.norvane.apps.clipweaver.testing.ChildJvm;
 import java.nio.ByteBuffer;
 import java.util.ArrayList;
 import java.util.List;

@@ -1,4 +1,4 @@
-package com.quilby.norvane.apps.clipweaver.music.detail;
+package com.quilby.norvane.apps.clipweaver.testing;
 
 import java.io.File;
 import java.io.IOException;
@@ -13,10 +13,10 @@ import java.util.concurrent.TimeUnit;
  * Runs a main class in a fresh JVM, because the native log lines go to the
  * process's standard error, which a test cannot capture in its own JVM.
  */
-final class ChildJvm {
-  final int exitCode;
-  final String stdout;
-  final String stderr;
+public final class ChildJvm {
+  public final int exitCode;
+  public final String stdout;
+  public final String stderr;
 
   private ChildJvm(int exitCode, String stdout, String stderr) {
     this.exitCode = exitCode;
@@ -24,7 +24,7 @@ final class ChildJvm {
     this.stderr = stderr;
   }
 
-  static ChildJvm run(Class<?> mainClass, String... args) throws IOException, InterruptedException {
+  public static ChildJvm run(Class<?> mainClass, String... args) throws IOException, InterruptedException {
     List<String> command = new ArrayList<>();
     command.add(System.getProperty("java.home") + File.separator + "bin" + File.separator + "java");
     command.add("-Djava.library.path=" + System.getProperty("java.library.path"));
@@ -57,7 +57,7 @@ final class ChildJvm {
   }
 
   /** The texts of the native log lines, without tag, file and line. */
-  List<String> nativeTexts() {
+  public List<String> nativeTexts() {
     List<String> texts = new ArrayList<>();
     for (String line : stderr.split("\n")) {
       if (!line.startsWith("native : ")) continue;
