@@ -1,0 +1,166 @@
+// The real FFT of real_fft.h over tables that are already built, for a
+// given two-lane type V. RealFft runs it with the target's Double2; running
+// it with PlainDouble2 as well shows both give the same bits.
+#ifndef CLIPWEAVER_FFT_REAL_TRANSFORM_H_
+#define CLIPWEAVER_FFT_REAL_TRANSFORM_H_
+
+#include "fft/complex_fft.h"
+#include "fft/complex_ops.h"
+#include "fft/twiddles.h"
+
+namespace fft_internal {
+
+// The split step on bins paired lane by lane: low holds X[k] of the n/2
+// complex points, high X[n/2 - k]; the weight is (wr, wi), conjugated
+// backward.
+template <typename V, bool kBackward>
+inline void SplitBins(Complex2<V>* low, Complex2<V>* high, V wr, V wi) {
+  const V xr = low->re - high->re;
+  const V xi = low->im + high->im;
+  const V yr = kBackward ? wr * xr + wi * xi : wr * xr - wi * xi;
+  const V yi = kBackward ? wr * xi - wi * xr : wr * xi + wi * xr;
+  low->re = low->re - yr;
+  low->im = low->im - yi;
+  high->re = high->re + yr;
+  high->im = high->im - yi;
+}
+
+// The last stage of the complex transform for elements k and h - k of the
+// lane layout (0 < k <= h/2), held in xk and xm; their real parts were at x
+// and y, imaginary parts `im` doubles on. With w^k = (wr, wi) it yields X[k]
+// and X[h - k], which take the places of the real parts, and X[h + k] and
+// X[2h - k], which take those of the imaginary parts: w^(h - k) = -conj(w^k)
+// is why the second lane of wr is negated. Forward, the split step follows
+// on the pairs (k, 2h - k) and (h - k, h + k) with the weights of bins k and
+// h - k at ck and cm; backward, the output is conjugated.
+template <typename V, bool kForward>
+inline void CombineGroup(Complex2<V> xk, Complex2<V> xm, double* x, double* y, std::ptrdiff_t im,
+                         V wr, V wi, const double* ck, const double* cm) {
+  const Complex2<V> even = {UnpackLow(xk.re, xm.re), UnpackLow(xk.im, xm.im)};
+  const Complex2<V> odd = {UnpackHigh(xk.re, xm.re), UnpackHigh(xk.im, xm.im)};
+  const Complex2<V> t = Mul(odd, wr, wi);
+  Complex2<V> low = even + t;
+  Complex2<V> high = even - t;
+  if (kForward) {
+    high = {Swap(high.re), Swap(high.im)};
+    SplitBins<V, false>(&low, &high, Splat<V>(0.5) - Make<V>(*cm, *ck), Make<V>(*ck, *cm));
+    Store(x, UnpackLow(low.re, low.im));
+    Store(y, UnpackHigh(low.re, low.im));
+    Store(y + im, UnpackLow(high.re, high.im));
+    Store(x + im, UnpackHigh(high.re, high.im));
+  } else {
+    low.im = Neg(low.im);
+    high.im = Neg(high.im);
+    Store(x, UnpackLow(low.re, low.im));
+    Store(y, UnpackHigh(low.re, low.im));
+    Store(x + im, UnpackLow(high.re, high.im));
+    Store(y + im, UnpackHigh(high.re, high.im));
+  }
+}
+
+// Last complex stage over the whole lane layout, back to (re, im) pairs in
+// natural order: element 0 alone, then the groups k and h/2 - k for each
+// twiddle, then the two groups that pair with themselves. tw is the
+// sub-table for the complex length 2h; the split weights are (1 - sin)/2
+// and cos/2 of pi k / (2h), from the cosine region c of nc entries, and
+// those of bins k and h - k share their entries.
+template <typename V, bool kForward>
+void Combine(int n, double* a, const double* tw, const double* c, int nc) {
+  const int h = n >> 2;
+  const std::ptrdiff_t im = 2 * h;
+  const std::ptrdiff_t step = nc / h;
+  const double* const c_end = c + nc;
+  const double* const c_half = c + nc / 2;
+  auto group = [&](double* x, double* y, V wr, V wi, const double* ck, const double* cm) {
+    CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), x, y, im, wr, wi, ck, cm);
+  };
+  // Element 0 gives X[0] = E[0] + O[0] and X[h] = E[0] - O[0].
+  const V sign = Make<V>(1, kForward ? 1 : -1);
+  const V re = Load<V>(a), im0 = Load<V>(a + im);
+  const V even = UnpackLow(re, im0), odd = UnpackHigh(re, im0);
+  Store(a, (even + odd) * sign);
+  Store(a + im, (even - odd) * sign);
+  // Group h/2 - k takes w^(h/2 - k) = i conj(w^k).
+  ForEachTwiddle<V>(2 * h, tw, [&](std::ptrdiff_t k, V w, V) {
+    const V negated = Neg(w);
+    const std::ptrdiff_t kk = k * step;
+    group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
+    group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
+          c_half + kk);
+  });
+  if (h >= 4) {
+    const V c4 = Splat<V>(kC4);
+    group(a + h / 2, a + im - h / 2, c4 * Make<V>(1, -1), c4, c + nc / 4, c_end - nc / 4);
+  }
+  group(a + h, a + h, Make<V>(0, -0.0), Splat<V>(1), c_half, c_half);
+}
+
+// Backward split step, in place on the packed spectrum, on the same groups
+// of bins as Combine (k = h/2 pairs with itself in both lanes).
+template <typename V>
+void SplitBackward(int n, double* a, const double* c, int nc) {
+  const int h = n >> 2;
+  const std::ptrdiff_t im = 2 * h;
+  const std::ptrdiff_t step = nc / h;
+  for (std::ptrdiff_t k = 1; k <= h / 2; ++k) {
+    double* const x = a + 2 * k;
+    double* const y = a + im - 2 * k;
+    const V xk = Load<V>(x), xm = Load<V>(y), yk = Load<V>(y + im), ym = Load<V>(x + im);
+    Complex2<V> low = {UnpackLow(xk, xm), UnpackHigh(xk, xm)};
+    Complex2<V> high = {UnpackLow(yk, ym), UnpackHigh(yk, ym)};
+    const double* const ck = c + k * step;
+    const double* const cm = c + nc - k * step;
+    SplitBins<V, true>(&low, &high, Splat<V>(0.5) - Make<V>(*cm, *ck), Make<V>(*ck, *cm));
+    Store(x, UnpackLow(low.re, low.im));
+    Store(y, UnpackHigh(low.re, low.im));
+    Store(y + im, UnpackLow(high.re, high.im));
+    Store(x + im, UnpackHigh(high.re, high.im));
+  }
+}
+
+// The whole complex stage for n >= 8, unscaled, exp(+...) forward and
+// exp(-...) backward.
+template <typename V, bool kForward>
+void ComplexStage(int n, double* data, const double* w_end, int nc) {
+  LaneTransform<V, !kForward>(n, data, w_end);
+  Combine<V, kForward>(n, data, w_end - (n >> 2), w_end, nc);
+}
+
+// The complex stage for n = 4, the same both ways.
+inline void TwoPoints(double* data) {
+  const double re = data[0] - data[2], im = data[1] - data[3];
+  data[0] += data[2];
+  data[1] += data[3];
+  data[2] = re;
+  data[3] = im;
+}
+
+template <typename V>
+void RealTransform(int n, int direction, double* data, const int* bit_reversal_work,
+                   const double* twiddle_table) {
+  const double* w_end = twiddle_table + bit_reversal_work[0];
+  const int nc = bit_reversal_work[1];
+  if (direction >= 0) {
+    if (n >= 8) {
+      ComplexStage<V, true>(n, data, w_end, nc);
+    } else if (n == 4) {
+      TwoPoints(data);
+    }
+    const double difference = data[0] - data[1];
+    data[0] += data[1];
+    data[1] = difference;
+  } else {
+    data[1] = 0.5 * (data[0] - data[1]);
+    data[0] -= data[1];
+    if (n >= 8) {
+      SplitBackward<V>(n, data, w_end, nc);
+      ComplexStage<V, false>(n, data, w_end, nc);
+    } else if (n == 4) {
+      TwoPoints(data);
+    }
+  }
+}
+
+}  // namespace fft_internal
+
+#endif  // CLIPWEAVER_FFT_REAL_TRANSFORM_H_
