@@ -33,6 +33,25 @@ void BM_SpectrogramAndOnsets60s(benchmark::State& state) {
 }
 BENCHMARK(BM_SpectrogramAndOnsets60s)->Unit(benchmark::kMillisecond);
 
+// One 1025-bin frame of the onset detector, as at 44.1 and 48 kHz.
+void BM_OnsetFrame(benchmark::State& state) {
+  std::vector<apm::SpectrogramFrame> frames(64, apm::SpectrogramFrame(1025));
+  uint32_t noise = 1;
+  for (auto& frame : frames) {
+    for (auto& bin : frame) {
+      noise = noise * 1664525u + 1013904223u;
+      bin = {static_cast<float>(noise >> 16) - 32768, static_cast<float>(noise & 0xFFFF) - 32768};
+    }
+  }
+  apm::OnsetDetector detector;
+  detector.Reset(1025);
+  size_t i = 0;
+  for (auto _ : state) {
+    benchmark::DoNotOptimize(detector.DetectFrame(frames[i++ % frames.size()].data()));
+  }
+}
+BENCHMARK(BM_OnsetFrame);
+
 // Stage times come from the progress reports: everything up to the first
 // report of the tracking stage (mix-down, spectrogram and onsets, which run
 // interleaved, then conditioning and the tracker's set-up), and the

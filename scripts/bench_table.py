@@ -42,6 +42,9 @@ if ours:
 analysis = medians("analysis_bench")
 whole = analysis.get("BM_WholeAnalysis180sStereo/iterations:3")
 front = analysis.get("BM_SpectrogramAndOnsets60s")
+onset = analysis.get("BM_OnsetFrame")
+if onset:
+    rows.append(("onset detection, one 1025-bin frame", f"{onset['real_time']:.0f} ns", ""))
 if front:
     rows.append(("spectrogram + onsets, 60 s mono", f"{front['real_time']:.1f} ms", ""))
 if whole:
@@ -53,10 +56,23 @@ for name, b in apm.items():
     rows.append((f"tracker ({name})", f"{b['real_time'] / 1000:.1f} us" if b["time_unit"] == "ns" else f"{b['real_time']:.1f} {b['time_unit']}", ""))
 
 resampler = medians("resampler_bench")
-for name, b in sorted(resampler.items()):
-    rate = b.get("items_per_second")
-    if rate:
-        rows.append((f"resampler {name}", f"{rate / 1e6:.0f} M frames/s", ""))
+
+
+def frames_per_second(name):
+    b = resampler.get(name)
+    return b.get("frames/s") if b else None
+
+
+for channels, stereo_out, label in [(1, 0, "mono"), (1, 1, "mono to stereo"), (2, 0, "stereo")]:
+    ours = frames_per_second(f"BM_LinearResampler/channels:{channels}/stereo_out:{stereo_out}")
+    if not ours:
+        continue
+    ratios = []
+    for ref, ref_label in [("BM_SamplerateLinear", "libsamplerate linear"), ("BM_SpeexQuality0", "speexdsp q0")]:
+        theirs = frames_per_second(f"{ref}/channels:{channels}")
+        if theirs and not stereo_out:
+            ratios.append(f"{ours / theirs:.1f}x {ref_label}")
+    rows.append((f"resampler 44.1 to 48 kHz, {label}", f"{ours / 1e6:.0f} M frames/s", ", ".join(ratios)))
 
 programs = {}
 path = os.path.join(out, "programs.txt")
