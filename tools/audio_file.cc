@@ -7,9 +7,12 @@
 #include <algorithm>
 #include <cctype>
 #include <cerrno>
+#include <cstdio>
 #include <cstring>
 #include <limits>
 #include <mutex>
+
+#include "tools/announced_length.h"
 
 namespace cwtool {
 namespace {
@@ -21,12 +24,11 @@ std::mutex& OpenLock() {
   return lock;
 }
 
-std::string Lowercased(std::string text) {
-  if (!text.empty()) {
-    text[0] = static_cast<char>(std::tolower(static_cast<unsigned char>(text[0])));
-  }
-  return text;
-}
+// 32-bit size fields, less room for the header chunks around the data.
+constexpr int64_t kMax32BitDataBytes = 0xFFFFFFFFll - 4096;
+// FLAC counts samples per channel in 36 bits.
+constexpr int64_t kMaxFlacFrames = (int64_t{1} << 36) - 1;
+constexpr int64_t kUnlimited = std::numeric_limits<int64_t>::max();
 
 std::string Extension(const std::string& path) {
   const size_t slash = path.find_last_of('/');
@@ -45,12 +47,78 @@ std::string OpenErrorText(int code) {
       return "unsupported format (not a sound file libsndfile can decode)";
     case SF_ERR_UNSUPPORTED_ENCODING:
       return "unsupported format (unknown encoding)";
+    case SF_ERR_SYSTEM:
+      return "unreadable: input/output error";
     default:
-      return "unreadable: " + Lowercased(sf_error_number(code));
+      return "damaged or unsupported sound file (its header does not make sense)";
   }
 }
 
+std::string SystemErrorText(int errno_value) {
+  switch (errno_value) {
+    case ENOENT:
+      return "no such file";
+    case EACCES:
+    case EPERM:
+      return "unreadable: permission denied";
+    case ENOTDIR:
+      return "no such file (a part of the path is not a directory)";
+    case ELOOP:
+      return "unreadable: too many symbolic links";
+    case ENAMETOOLONG:
+      return "unreadable: name too long";
+    default:
+      return "unreadable: input/output error";
+  }
+}
+
+const char* SpecialFileKind(mode_t mode) {
+  if (S_ISFIFO(mode)) return "a named pipe";
+  if (S_ISSOCK(mode)) return "a socket";
+  if (S_ISCHR(mode)) return "a character device";
+  if (S_ISBLK(mode)) return "a block device";
+  return "not a regular file";
+}
+
+std::string Seconds(double seconds) {
+  char text[32];
+  snprintf(text, sizeof(text), "%.2f s", seconds);
+  return text;
+}
+
+// The format and the most frames it holds, or 0 for an unknown extension.
+int ContainerFor(const std::string& path, int32_t channels, int64_t frames,
+                 int64_t* frame_limit) {
+  const std::string ext = Extension(path);
+  const int64_t bytes_per_frame = 2 * static_cast<int64_t>(std::max(channels, 1));
+  const int64_t limit_32bit = kMax32BitDataBytes / bytes_per_frame;
+  *frame_limit = kUnlimited;
+  if (ext == "wav") {
+    return frames < 0 || frames > limit_32bit ? SF_FORMAT_RF64 | SF_FORMAT_PCM_16
+                                              : SF_FORMAT_WAV | SF_FORMAT_PCM_16;
+  }
+  if (ext == "ogg" || ext == "oga") return SF_FORMAT_OGG | SF_FORMAT_VORBIS;
+  if (ext == "flac") {
+    *frame_limit = kMaxFlacFrames;
+    return SF_FORMAT_FLAC | SF_FORMAT_PCM_16;
+  }
+  *frame_limit = limit_32bit;
+  if (ext == "aiff" || ext == "aif") return SF_FORMAT_AIFF | SF_FORMAT_PCM_16;
+  if (ext == "au") return SF_FORMAT_AU | SF_FORMAT_PCM_16;
+  return 0;
+}
+
+std::string TooLongText(const std::string& ext, int64_t frame_limit,
+                        int32_t sample_rate) {
+  return "too long for ." + ext + " (it holds at most " +
+         Seconds(static_cast<double>(frame_limit) / sample_rate) +
+         " at this rate and channel count); use .wav, .flac or .ogg";
+}
+
 }  // namespace
+
+const char kUnknownOutputFormat[] =
+    "unknown output format (use .wav, .flac, .ogg, .aiff or .au)";
 
 AudioReader::~AudioReader() {
   if (file_ != nullptr) sf_close(file_);
@@ -58,27 +126,33 @@ AudioReader::~AudioReader() {
 }
 
 bool AudioReader::Open(const std::string& path, std::string* error) {
+  // Non-blocking, so that a pipe without a writer cannot hold up the open;
+  // anything but a regular file is refused right after it.
+  fd_ = open(path.c_str(), O_RDONLY | O_CLOEXEC | O_NONBLOCK | O_NOCTTY);
+  if (fd_ < 0) {
+    *error = SystemErrorText(errno);
+    return false;
+  }
   struct stat status;
-  if (stat(path.c_str(), &status) != 0) {
-    *error = errno == ENOENT ? "no such file"
-                             : "unreadable: " + Lowercased(std::strerror(errno));
+  if (fstat(fd_, &status) != 0) {
+    *error = SystemErrorText(errno);
     return false;
   }
   if (S_ISDIR(status.st_mode)) {
     *error = "is a directory, not a sound file";
     return false;
   }
-  if (S_ISREG(status.st_mode) && status.st_size == 0) {
+  if (!S_ISREG(status.st_mode)) {
+    *error = std::string("is ") + SpecialFileKind(status.st_mode) +
+             ", not a regular file (sound files are read with seeks)";
+    return false;
+  }
+  if (status.st_size == 0) {
     *error = "no audio (the file is empty)";
     return false;
   }
-  // Opening the path ourselves tells "permission denied" apart from the
-  // format errors that libsndfile reports.
-  fd_ = open(path.c_str(), O_RDONLY | O_CLOEXEC);
-  if (fd_ < 0) {
-    *error = "unreadable: " + Lowercased(std::strerror(errno));
-    return false;
-  }
+  fcntl(fd_, F_SETFL, fcntl(fd_, F_GETFL) & ~O_NONBLOCK);
+  const int64_t announced = AnnouncedFrames(fd_);
   {
     std::lock_guard<std::mutex> hold(OpenLock());
     info_ = SF_INFO{};
@@ -90,12 +164,23 @@ bool AudioReader::Open(const std::string& path, std::string* error) {
     *error = "unsupported format (no channels or no sample rate)";
     return false;
   }
+  const int64_t decoded = info_.frames > 0 && info_.frames < SF_COUNT_MAX ? info_.frames : -1;
+  announced_frames_ = std::max(announced, decoded);
   return true;
 }
 
 int64_t AudioReader::Read(int16_t* frames, int64_t count) {
   const sf_count_t got = sf_readf_short(file_, frames, count);
-  return got > 0 ? got : 0;
+  if (got <= 0) return 0;
+  frames_read_ += got;
+  return got;
+}
+
+std::string AudioReader::ShortfallWarning() const {
+  if (announced_frames_ <= frames_read_) return std::string();
+  const double rate = info_.samplerate;
+  return "truncated: " + Seconds(frames_read_ / rate) + " present of " +
+         Seconds(announced_frames_ / rate) + " announced; analysed what is there";
 }
 
 AudioWriter::~AudioWriter() {
@@ -103,56 +188,69 @@ AudioWriter::~AudioWriter() {
 }
 
 int OutputFormatFor(const std::string& path) {
-  const std::string ext = Extension(path);
-  if (ext == "wav") return SF_FORMAT_WAV | SF_FORMAT_PCM_16;
-  if (ext == "flac") return SF_FORMAT_FLAC | SF_FORMAT_PCM_16;
-  if (ext == "ogg" || ext == "oga") return SF_FORMAT_OGG | SF_FORMAT_VORBIS;
-  if (ext == "aiff" || ext == "aif") return SF_FORMAT_AIFF | SF_FORMAT_PCM_16;
-  if (ext == "au") return SF_FORMAT_AU | SF_FORMAT_PCM_16;
-  return 0;
+  int64_t limit;
+  return ContainerFor(path, 1, 0, &limit);
 }
 
 bool AudioWriter::Open(const std::string& path, int32_t sample_rate,
-                       int32_t channels, std::string* error) {
+                       int32_t channels, int64_t frames, std::string* error) {
   SF_INFO info{};
+  sample_rate_ = sample_rate;
   info.samplerate = sample_rate;
   info.channels = channels;
-  info.format = OutputFormatFor(path);
+  extension_ = Extension(path);
+  info.format = ContainerFor(path, channels, frames, &frame_limit_);
   if (info.format == 0) {
-    *error = "unknown output format (use .wav, .flac, .ogg, .aiff or .au)";
+    *error = kUnknownOutputFormat;
+    return false;
+  }
+  if (frames > frame_limit_) {
+    *error = "cannot write: " + TooLongText(extension_, frame_limit_, sample_rate);
     return false;
   }
   if (!sf_format_check(&info)) {
     *error = "cannot store " + std::to_string(sample_rate) + " Hz, " +
-             std::to_string(channels) + " channels as ." + Extension(path);
+             std::to_string(channels) + " channels as ." + extension_;
     return false;
   }
+  if (!output_.Create(path, error)) return false;
   std::lock_guard<std::mutex> hold(OpenLock());
-  file_ = sf_open(path.c_str(), SFM_WRITE, &info);
+  file_ = sf_open_fd(output_.fd(), SFM_WRITE, &info, SF_FALSE);
   if (file_ == nullptr) {
-    *error = "cannot write: " + Lowercased(sf_strerror(nullptr));
+    *error = "cannot write: the encoder refused the settings";
     return false;
+  }
+  // An unknown length may still end below 4 GiB: then a plain WAV.
+  if (frames < 0 && (info.format & SF_FORMAT_TYPEMASK) == SF_FORMAT_RF64) {
+    sf_command(file_, SFC_RF64_AUTO_DOWNGRADE, nullptr, SF_TRUE);
   }
   return true;
 }
 
 bool AudioWriter::Write(const int16_t* frames, int64_t count,
                         std::string* error) {
-  if (sf_writef_short(file_, frames, count) != count) {
-    *error = "cannot write: " + Lowercased(sf_strerror(file_));
+  if (count > frame_limit_ - frames_written_) {
+    *error = "cannot write: " + TooLongText(extension_, frame_limit_, sample_rate_);
     return false;
   }
+  errno = 0;
+  if (sf_writef_short(file_, frames, count) != count) {
+    *error = WriteErrorText(errno);
+    return false;
+  }
+  frames_written_ += count;
   return true;
 }
 
 bool AudioWriter::Close(std::string* error) {
+  errno = 0;
   const int code = sf_close(file_);
   file_ = nullptr;
   if (code != 0) {
-    *error = "cannot write: " + Lowercased(sf_error_number(code));
+    *error = WriteErrorText(errno);
     return false;
   }
-  return true;
+  return output_.Commit(error);
 }
 
 bool DecodeFile(const std::string& path, const std::atomic<bool>& stop,
@@ -184,6 +282,7 @@ bool DecodeFile(const std::string& path, const std::atomic<bool>& stop,
     *error = "no audio (the file holds no samples)";
     return false;
   }
+  audio->warning = reader.ShortfallWarning();
   return true;
 }
 

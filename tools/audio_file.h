@@ -9,6 +9,8 @@
 #include <string>
 #include <vector>
 
+#include "tools/output_file.h"
+
 namespace cwtool {
 
 // A whole file in memory.
@@ -16,6 +18,8 @@ struct DecodedAudio {
   int32_t sample_rate = 0;
   int32_t channels = 0;
   std::vector<int16_t> samples;  // interleaved
+  // Set when the header announced more than the file holds.
+  std::string warning;
 
   int64_t frames() const {
     return channels > 0 ? static_cast<int64_t>(samples.size()) / channels : 0;
@@ -32,20 +36,26 @@ class AudioReader {
   AudioReader(const AudioReader&) = delete;
   AudioReader& operator=(const AudioReader&) = delete;
 
-  // On failure *error says why in a few words ("no such file", ...).
+  // Only regular files: pipes and devices are refused without waiting on
+  // them. On failure *error says why in a few words ("no such file", ...).
   bool Open(const std::string& path, std::string* error);
   int32_t sample_rate() const { return info_.samplerate; }
   int32_t channels() const { return info_.channels; }
-  // As the header claims; a hint only.
-  int64_t frames() const { return info_.frames; }
+  // As the header claims, at least; -1 when unknown.
+  int64_t frames() const { return announced_frames_; }
   // Frames read into `frames` (room for count * channels() samples); 0 at
   // the end or on a decoding error.
   int64_t Read(int16_t* frames, int64_t count);
+  // After the last Read: a warning when fewer frames came than announced,
+  // else empty.
+  std::string ShortfallWarning() const;
 
  private:
   int fd_ = -1;
   SNDFILE* file_ = nullptr;
   SF_INFO info_{};
+  int64_t announced_frames_ = -1;
+  int64_t frames_read_ = 0;
 };
 
 class AudioWriter {
@@ -57,14 +67,23 @@ class AudioWriter {
 
   // The container follows the extension: .wav, .flac, .ogg (Vorbis),
   // .aiff/.aif or .au; 16-bit wherever the container has a bit depth.
+  // frames is the length about to be written (-1: unknown); a length the
+  // container cannot hold is refused here, before anything is written.
+  // Nothing appears under path before Close().
   bool Open(const std::string& path, int32_t sample_rate, int32_t channels,
-            std::string* error);
+            int64_t frames, std::string* error);
   bool Write(const int16_t* frames, int64_t count, std::string* error);
-  // Finishes the file; false when the last writes or the header failed.
+  // Finishes the file and puts it in place; false when the last writes or
+  // the header failed.
   bool Close(std::string* error);
 
  private:
+  OutputFile output_;
   SNDFILE* file_ = nullptr;
+  int32_t sample_rate_ = 0;
+  int64_t frame_limit_ = 0;
+  int64_t frames_written_ = 0;
+  std::string extension_;
 };
 
 // Reads all of path. Gives up with the error "interrupted" as soon as
@@ -72,9 +91,12 @@ class AudioWriter {
 bool DecodeFile(const std::string& path, const std::atomic<bool>& stop,
                 DecodedAudio* audio, std::string* error);
 
-// The libsndfile format for an output file name, or 0 for an extension it
-// does not know.
+// The libsndfile container for an output file name, or 0 for an extension
+// it does not know. The length decides between WAV and RF64 later.
 int OutputFormatFor(const std::string& path);
+
+// "unknown output format (use ...)" for the error lines.
+extern const char kUnknownOutputFormat[];
 
 }  // namespace cwtool
 

@@ -8,6 +8,7 @@
 #include "tools/audio_file.h"
 #include "tools/click_track.h"
 #include "tools/interrupt.h"
+#include "tools/output_file.h"
 #include "tools/svg_plot.h"
 
 namespace cwtool {
@@ -54,7 +55,7 @@ std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& audio,
                         analyzer.frames_per_second(),
                         &result.beats,
                         result.bpm};
-    if (!WriteBeatPlot(extras.plot_path, plot, &error)) {
+    if (!WriteTextFile(extras.plot_path, BeatPlotSvg(plot), &error)) {
       return extras.plot_path + ": " + error;
     }
   }
@@ -76,6 +77,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   result.sample_rate = audio.sample_rate;
   result.channels = audio.channels;
   result.duration = audio.seconds();
+  result.warning = audio.warning;
   result.error = CheckLength(audio);
   if (!result.error.empty()) return result;
 
@@ -101,6 +103,10 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     result.bpm = analyzer.bpm();
   }
   result.output_error = WriteExtras(extras, audio, analyzer, result);
+  if (stop.load()) {
+    result.interrupted = true;
+    return result;
+  }
   progress(100);
   return result;
 }

@@ -18,6 +18,7 @@ struct BeatResult {
   std::string path;
   std::string error;  // why there is no result; empty on success
   bool interrupted = false;
+  std::string warning;  // the result stands, with this said about the input
   int32_t sample_rate = 0;
   int32_t channels = 0;
   double duration = 0;  // seconds
@@ -32,8 +33,8 @@ struct ExtraOutputs {
   std::string plot_path;
 };
 
-// progress gets 0..100 percent. Stops early, with `interrupted` set, once
-// Ctrl-C has been pressed.
+// progress gets 0..100 percent. Stops early, with `interrupted` set and no
+// extra output left behind, once Ctrl-C has been pressed.
 BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
                        const std::function<void(int)>& progress);
 

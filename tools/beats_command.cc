@@ -4,6 +4,7 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdio>
 #include <thread>
 #include <vector>
 
@@ -11,8 +12,10 @@
 #include "tools/console.h"
 #include "tools/interrupt.h"
 #include "tools/ordered_batch.h"
+#include "tools/output_collisions.h"
 #include "tools/report.h"
 #include "tools/stderr_silencer.h"
+#include "tools/text_escape.h"
 
 namespace cwtool {
 namespace {
@@ -32,9 +35,24 @@ ExtraOutputs ExtrasFor(const BeatsOptions& options, const std::string& file) {
   return extras;
 }
 
+std::string CheckOutputs(const BeatsOptions& options) {
+  std::vector<PlannedOutput> outputs;
+  for (const std::string& file : options.files) {
+    const ExtraOutputs extras = ExtrasFor(options, file);
+    if (!extras.click_path.empty()) outputs.push_back({extras.click_path, "--click output"});
+    if (!extras.plot_path.empty()) outputs.push_back({extras.plot_path, "--plot output"});
+  }
+  return FindCollision(options.files, outputs);
+}
+
 }  // namespace
 
 int RunBeats(const BeatsOptions& options) {
+  const std::string collision = CheckOutputs(options);
+  if (!collision.empty()) {
+    fprintf(stderr, "clipweaver: %s\n", collision.c_str());
+    return 2;
+  }
   const size_t count = options.files.size();
   const int cores = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
   const int workers = static_cast<int>(
@@ -45,7 +63,6 @@ int RunBeats(const BeatsOptions& options) {
   const int err_fd = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, 0);
   const bool bars = !options.quiet && !options.verbose && isatty(err_fd);
   StderrSilencer silencer(!options.verbose);
-  InstallInterruptHandler();
   const std::atomic<bool>& interrupted = InterruptFlag();
 
   int failures = 0;
@@ -55,7 +72,7 @@ int RunBeats(const BeatsOptions& options) {
     std::vector<BeatResult> results(count);
     OrderedBatch batch(count, workers, [&](size_t index, int worker) {
       const std::string& file = options.files[index];
-      const std::string label = BaseName(file);
+      const std::string label = TerminalText(BaseName(file));
       console.Progress(worker, label, 0);
       results[index] = AnalyseFile(
           file, ExtrasFor(options, file),
@@ -64,10 +81,17 @@ int RunBeats(const BeatsOptions& options) {
     });
 
     console.Result(report.Header());
+    size_t finished = 0;
+    std::string stopped;  // the first file Ctrl-C cut short
     for (size_t i = 0; i < count; ++i) {
       batch.WaitFor(i);
       BeatResult& r = results[i];
-      if (r.interrupted) continue;
+      if (r.interrupted) {
+        if (stopped.empty()) stopped = options.files[i];
+        continue;
+      }
+      ++finished;
+      if (!r.warning.empty()) console.Message("clipweaver: " + r.path + ": warning: " + r.warning);
       if (!r.error.empty()) {
         ++failures;
         console.Message("clipweaver: " + r.path + ": " + r.error);
@@ -81,7 +105,12 @@ int RunBeats(const BeatsOptions& options) {
       }
       r = BeatResult{};  // printed: its memory can go
     }
-    if (interrupted.load()) console.Message("clipweaver: interrupted");
+    if (interrupted.load()) {
+      console.Message("clipweaver: interrupted: " +
+                      (stopped.empty() ? "" : "analysis of " + stopped + " stopped; ") +
+                      std::to_string(finished) + " of " + std::to_string(count) +
+                      " files done, no output left from the others");
+    }
     // Leaving the scope joins the workers before the console goes.
   }
   close(err_fd);

@@ -4,6 +4,8 @@
 #include <cmath>
 #include <cstdint>
 
+#include "tools/interrupt.h"
+
 namespace cwtool {
 namespace {
 
@@ -31,7 +33,9 @@ std::vector<float> ClickShape(int32_t sample_rate) {
 bool WriteClickTrack(const std::string& path, const DecodedAudio& audio,
                      const std::vector<float>& beats, std::string* error) {
   AudioWriter writer;
-  if (!writer.Open(path, audio.sample_rate, audio.channels, error)) return false;
+  if (!writer.Open(path, audio.sample_rate, audio.channels, audio.frames(), error)) {
+    return false;
+  }
   const std::vector<float> click = ClickShape(audio.sample_rate);
   const int64_t click_frames = static_cast<int64_t>(click.size());
   std::vector<int64_t> starts;
@@ -45,6 +49,7 @@ bool WriteClickTrack(const std::string& path, const DecodedAudio& audio,
   std::vector<int16_t> block;
   size_t first_beat = 0;
   for (int64_t begin = 0; begin < frames; begin += kBlockFrames) {
+    if (Interrupted()) return false;
     const int64_t end = std::min(frames, begin + kBlockFrames);
     mix.assign(audio.samples.begin() + begin * channels,
                audio.samples.begin() + end * channels);

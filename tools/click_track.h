@@ -10,7 +10,7 @@
 namespace cwtool {
 
 // Same rate and channels as the input; the container follows the
-// extension of path.
+// extension of path. Stops, writing nothing, on Ctrl-C.
 bool WriteClickTrack(const std::string& path, const DecodedAudio& audio,
                      const std::vector<float>& beats, std::string* error);
 

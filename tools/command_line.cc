@@ -7,6 +7,8 @@
 #include <map>
 #include <set>
 
+#include "tools/audio_file.h"
+
 namespace cwtool {
 namespace {
 
@@ -160,6 +162,13 @@ std::string ParseBeats(const Arguments& a, BeatsOptions* out) {
                                                           : out->plot_pattern;
     target = pattern;
     if (pattern.empty()) return std::string("--") + option + " needs a file name";
+    if (std::string(option) == "click" && OutputFormatFor(pattern) == 0) {
+      return "--click '" + pattern + "': " + kUnknownOutputFormat;
+    }
+    if (std::string(option) == "plot" &&
+        (pattern.size() < 4 || pattern.compare(pattern.size() - 4, 4, ".svg") != 0)) {
+      return "--plot '" + pattern + "' does not end in .svg";
+    }
     if (out->files.size() == 1) continue;
     if (pattern.find("{}") == std::string::npos) {
       return std::string("--") + option +
@@ -182,6 +191,7 @@ std::string ParseResample(const Arguments& a, ResampleSettings* out) {
   if (a.positional.size() != 2) return "resample needs IN and OUT";
   out->input = a.positional[0];
   out->output = a.positional[1];
+  if (OutputFormatFor(out->output) == 0) return out->output + ": " + kUnknownOutputFormat;
   if (!a.values.count("rate")) return "resample needs --rate HZ";
   if (!ParseInt(a.values.at("rate"), kMinRate, kMaxRate, &out->rate)) {
     return RateError(a.values.at("rate"));
@@ -205,6 +215,7 @@ std::string ParseResample(const Arguments& a, ResampleSettings* out) {
 std::string ParseExample(const Arguments& a, GrooveSettings* out, std::string* path) {
   if (a.positional.size() != 1) return "example needs exactly one OUT file";
   *path = a.positional[0];
+  if (OutputFormatFor(*path) == 0) return *path + ": " + kUnknownOutputFormat;
   if (a.values.count("bpm") && !ParseDouble(a.values.at("bpm"), 40, 300, &out->bpm)) {
     return "--bpm '" + a.values.at("bpm") + "' is not a tempo from 40 to 300";
   }

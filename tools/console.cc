@@ -6,6 +6,8 @@
 #include <cerrno>
 #include <cstdio>
 
+#include "tools/text_escape.h"
+
 namespace cwtool {
 
 Console::Console(int err_fd, int bar_rows)
@@ -45,7 +47,7 @@ void Console::Result(const std::string& text) {
 void Console::Message(const std::string& line) {
   std::lock_guard<std::mutex> hold(lock_);
   const bool shown = bars_.shown();
-  std::string out = bars_.Erase() + line + "\n";
+  std::string out = bars_.Erase() + TerminalText(line) + "\n";
   if (shown) out += bars_.Draw(Columns());
   WriteErr(out);
 }

@@ -22,7 +22,7 @@ class Console {
   Console& operator=(const Console&) = delete;
 
   void Result(const std::string& text);
-  // One line; the newline is added.
+  // One line, its control characters escaped; the newline is added.
   void Message(const std::string& line);
   void Progress(int row, const std::string& label, int percent);
   void ProgressIdle(int row);

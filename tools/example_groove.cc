@@ -5,6 +5,7 @@
 #include <vector>
 
 #include "tools/audio_file.h"
+#include "tools/interrupt.h"
 
 namespace cwtool {
 namespace {
@@ -92,14 +93,15 @@ void RenderGroove(const GrooveSettings& settings, int64_t first, int32_t count,
 
 bool WriteGroove(const std::string& path, const GrooveSettings& settings,
                  std::string* error) {
+  const int64_t frames = GrooveFrames(settings);
   AudioWriter writer;
-  if (!writer.Open(path, settings.sample_rate, settings.channels, error)) {
+  if (!writer.Open(path, settings.sample_rate, settings.channels, frames, error)) {
     return false;
   }
   constexpr int32_t kBlockFrames = 4096;
   std::vector<int16_t> block(static_cast<size_t>(kBlockFrames * settings.channels));
-  const int64_t frames = GrooveFrames(settings);
   for (int64_t first = 0; first < frames; first += kBlockFrames) {
+    if (Interrupted()) return false;
     const int32_t count = static_cast<int32_t>(std::min<int64_t>(kBlockFrames, frames - first));
     RenderGroove(settings, first, count, block.data());
     if (!writer.Write(block.data(), count, error)) return false;

@@ -24,7 +24,8 @@ int64_t GrooveFrames(const GrooveSettings& settings);
 void RenderGroove(const GrooveSettings& settings, int64_t first, int32_t count,
                   int16_t* out);
 
-// The container follows the extension of path.
+// The container follows the extension of path. Stops, writing nothing, on
+// Ctrl-C.
 bool WriteGroove(const std::string& path, const GrooveSettings& settings,
                  std::string* error);
 

@@ -17,8 +17,9 @@ void InstallInterruptHandler() {
   struct sigaction action {};
   action.sa_handler = OnInterrupt;
   sigemptyset(&action.sa_mask);
-  // One-shot: the default action is back for a second Ctrl-C.
-  action.sa_flags = SA_RESETHAND;
+  // libsndfile does not retry on EINTR; every wait here is on a regular
+  // file, so restarting loses no promptness.
+  action.sa_flags = SA_RESTART;
   sigaction(SIGINT, &action, nullptr);
 }
 

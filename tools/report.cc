@@ -16,7 +16,7 @@ std::string Number(const char* format, double value) {
 }
 
 std::string Text(const BeatResult& r) {
-  std::string out = r.path + ": ";
+  std::string out = TerminalText(r.path) + ": ";
   out += r.bpm > 0 ? Number("%.2f BPM", r.bpm) : "tempo unknown";
   out += ", " + std::to_string(r.beats.size()) + " beats in " +
          Number("%.2f s", r.duration) + " (" + std::to_string(r.sample_rate) +

@@ -7,6 +7,7 @@
 
 #include "resampler/audio_resampler.h"
 #include "tools/audio_file.h"
+#include "tools/interrupt.h"
 
 namespace cwtool {
 namespace {
@@ -16,16 +17,20 @@ constexpr int64_t kTargetBlockFrames = 4096;
 // The resampler starts every call at the start of its block and makes
 // floor(out * n / in) frames of it, dropping the rest of the fraction. Whole
 // multiples of in / gcd(in, out) frames convert without remainder, so only
-// the final block can lose a fraction of a frame.
+// the final block can lose a fraction of a frame. The block is sized by the
+// larger side, so one block's output stays within one unit of out / gcd
+// frames (3 MB of stereo at most) whatever the ratio.
 int64_t InputBlockFrames(int32_t in_rate, int32_t out_rate) {
-  const int64_t unit = in_rate / std::gcd(in_rate, out_rate);
-  return unit * std::max<int64_t>(1, kTargetBlockFrames / unit);
+  const int64_t divisor = std::gcd(in_rate, out_rate);
+  const int64_t in_unit = in_rate / divisor;
+  const int64_t out_unit = out_rate / divisor;
+  return in_unit * std::max<int64_t>(1, kTargetBlockFrames / std::max(in_unit, out_unit));
 }
 
 }  // namespace
 
 bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
-                  std::string* error) {
+                  std::string* warning, std::string* error) {
   AudioReader reader;
   if (!reader.Open(settings.input, error)) {
     *error = settings.input + ": " + *error;
@@ -45,8 +50,10 @@ bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
              " Hz is more than the 3:1 reduction the resampler allows";
     return false;
   }
+  const int64_t expected =
+      reader.frames() < 0 ? -1 : reader.frames() * settings.rate / in_rate;
   AudioWriter writer;
-  if (!writer.Open(settings.output, settings.rate, channels, error)) {
+  if (!writer.Open(settings.output, settings.rate, channels, expected, error)) {
     *error = settings.output + ": " + *error;
     return false;
   }
@@ -64,6 +71,7 @@ bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
       (in_block * settings.rate / in_rate + 1) * channels));
   *frames_written = 0;
   for (;;) {
+    if (Interrupted()) return false;
     const int64_t got = reader.Read(input.data(), in_block);
     if (got == 0) break;
     const int64_t made = got * settings.rate / in_rate;
@@ -75,6 +83,7 @@ bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
     }
     *frames_written += made;
   }
+  *warning = reader.ShortfallWarning();
   if (!writer.Close(error)) {
     *error = settings.output + ": " + *error;
     return false;

@@ -16,9 +16,11 @@ struct ResampleSettings {
   float right_gain = 1.0f;
 };
 
-// On failure *error names the file at fault and the reason.
+// On failure *error names the file at fault and the reason; after Ctrl-C
+// it stays empty. Nothing appears at the output unless the whole input was
+// converted. *warning tells of an input shorter than its header announced.
 bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
-                  std::string* error);
+                  std::string* warning, std::string* error);
 
 }  // namespace cwtool
 

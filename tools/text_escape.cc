@@ -1,5 +1,6 @@
 #include "tools/text_escape.h"
 
+#include <algorithm>
 #include <cstdint>
 #include <cstdio>
 
@@ -93,6 +94,37 @@ std::string XmlText(const std::string& text) {
                        c != '\r'
                    ? '?'
                    : c;
+    }
+  }
+  return out;
+}
+
+std::string TerminalText(const std::string& text) {
+  std::string out;
+  const auto escape = [&](uint8_t byte) {
+    char escaped[8];
+    snprintf(escaped, sizeof(escaped), "\\x%02X", byte);
+    out += escaped;
+  };
+  for (size_t i = 0; i < text.size();) {
+    const size_t length = SequenceLength(text, i);
+    const auto lead = static_cast<uint8_t>(text[i]);
+    // C1 controls (U+0080..U+009F) steer terminals as the C0 ones do.
+    const bool c1 = length == 2 && lead == 0xC2 && static_cast<uint8_t>(text[i + 1]) < 0xA0;
+    if (length == 0 || lead < 0x20 || lead == 0x7F || c1) {
+      switch (text[i]) {
+        case '\n': out += "\\n"; break;
+        case '\r': out += "\\r"; break;
+        case '\t': out += "\\t"; break;
+        default:
+          for (size_t k = 0; k < std::max<size_t>(length, 1); ++k) {
+            escape(static_cast<uint8_t>(text[i + k]));
+          }
+      }
+      i += std::max<size_t>(length, 1);
+    } else {
+      out.append(text, i, length);
+      i += length;
     }
   }
   return out;

@@ -17,6 +17,11 @@ std::string JsonString(const std::string& text);
 // Text for XML content or attribute values.
 std::string XmlText(const std::string& text);
 
+// Text for a terminal or a log: control characters and bytes that are not
+// UTF-8 become C-style escapes (\n, \x1B), so that a file name can neither
+// split a line nor steer the terminal.
+std::string TerminalText(const std::string& text);
+
 // One CSV field, quoted when it has to be.
 std::string CsvField(const std::string& text);
 

@@ -3,7 +3,6 @@ Ctrl-C."""
 import os
 import pty
 import re
-import signal
 import subprocess
 import unittest
 
@@ -80,22 +79,6 @@ class ProgressBar(unittest.TestCase):
         shown, _ = run_on_terminal('beats', '--verbose', groove)
         self.assertNotIn('%', shown)
         self.assertIn('native : ', shown)
-
-
-class Interrupt(unittest.TestCase):
-    def test_ctrl_c_prints_what_finished_and_exits_with_130(self):
-        short = example('groove.wav')
-        long = example('ten-minutes.wav', seconds=600)
-        process = subprocess.Popen(
-            [tool_harness.TOOL, 'beats', '-j1', short, long, short],
-            stdout=subprocess.PIPE, stderr=subprocess.PIPE, text=True)
-        first = process.stdout.readline()
-        process.send_signal(signal.SIGINT)
-        rest, errors = process.communicate(timeout=60)
-        self.assertEqual(process.returncode, 130)
-        self.assertTrue(first.startswith(short + ': 120.00 BPM'))
-        self.assertNotIn(long, rest)
-        self.assertEqual(errors, 'clipweaver: interrupted\n')
 
 
 if __name__ == '__main__':

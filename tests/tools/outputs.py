@@ -77,7 +77,7 @@ class ClickTrackAndPlot(unittest.TestCase):
         self.assertEqual(done.returncode, 1)
         self.assertTrue(done.stdout.startswith(self.groove + ': 120.00 BPM'))
         self.assertEqual(done.stderr, f'clipweaver: {self.groove}: no/such/dir/x.svg: '
-                                      'cannot write: No such file or directory\n')
+                                      'cannot write: no such directory\n')
 
 
 if __name__ == '__main__':

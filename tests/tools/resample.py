@@ -62,9 +62,6 @@ class Resample(unittest.TestCase):
                          'is more than the 3:1 reduction the resampler allows\n')
         done = run('resample', 'absent.wav', 'x.wav', '--rate', 8000)
         self.assertEqual(done.stderr, 'clipweaver: absent.wav: no such file\n')
-        done = run('resample', self.mono, 'x.mp4', '--rate', 44100)
-        self.assertEqual(done.stderr, 'clipweaver: x.mp4: unknown output format '
-                         '(use .wav, .flac, .ogg, .aiff or .au)\n')
 
 
 if __name__ == '__main__':

@@ -5,6 +5,7 @@ Each suite runs as: python3 SUITE.py PATH/TO/clipweaver WORK_DIR
 import array
 import json
 import os
+import resource
 import shutil
 import subprocess
 import sys
@@ -27,9 +28,26 @@ def path(name):
     return os.path.join(WORK, name)
 
 
-def run(*args, timeout=300):
+# Every run is bounded in address space as well as in time, so that a
+# buffer sized from the input fails the test rather than the machine.
+MEMORY_LIMIT = 1 << 30
+
+
+def limit_memory(limit=MEMORY_LIMIT):
+    return lambda: resource.setrlimit(resource.RLIMIT_AS, (limit, limit))
+
+
+def run(*args, timeout=300, memory=MEMORY_LIMIT):
     return subprocess.run([TOOL, *map(str, args)], capture_output=True,
-                          text=True, timeout=timeout, cwd=WORK)
+                          text=True, timeout=timeout, cwd=WORK,
+                          preexec_fn=limit_memory(memory))
+
+
+def start(*args, **options):
+    """The tool running in the background, for tests that interrupt it."""
+    return subprocess.Popen([TOOL, *map(str, args)], stdout=subprocess.PIPE,
+                            stderr=subprocess.PIPE, text=True, cwd=WORK,
+                            preexec_fn=limit_memory(), **options)
 
 
 def example(name, bpm=120, rate=44100, channels=2, seconds=20):

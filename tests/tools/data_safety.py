@@ -1,0 +1,164 @@
+"""Nothing lost: refused collisions, formats' size limits, bounded memory,
+pipes that cannot block, and Ctrl-C that leaves every file as it was."""
+import hashlib
+import os
+import signal
+import time
+import unittest
+import wave
+
+from tool_harness import example, main, path, read_wav, run, start
+
+
+def digest(name):
+    with open(path(name), 'rb') as f:
+        return hashlib.sha256(f.read()).hexdigest()
+
+
+def listing():
+    return sorted(os.listdir(path('.')))
+
+
+def wait_for_partial(prefix, size):
+    """The hidden temporary file of an output in the works, once it holds
+    at least size bytes."""
+    deadline = time.monotonic() + 30
+    while time.monotonic() < deadline:
+        for name in os.listdir(path('.')):
+            if name.startswith('.' + prefix) and os.path.getsize(path(name)) >= size:
+                return path(name)
+        time.sleep(0.01)
+    raise AssertionError(f'no temporary file for {prefix}')
+
+
+class DataSafety(unittest.TestCase):
+    @classmethod
+    def setUpClass(cls):
+        cls.a = example('a.wav', seconds=3)
+        cls.b = example('b.wav', 100, seconds=3)
+        os.link(cls.a, path('a-hard.wav'))
+        os.symlink('a.wav', path('a-link.wav'))
+        os.makedirs(path('sub'))
+        os.mkfifo(path('pipe.wav'))
+        with open(path('kept.wav'), 'wb') as f:
+            f.write(b'an older file')
+        # 5 frames at 1 Hz: upsampled to 768 kHz, 3.84 million frames.
+        with wave.open(path('one-hertz.wav'), 'wb') as w:
+            w.setnchannels(2)
+            w.setsampwidth(2)
+            w.setframerate(1)
+            w.writeframes(b'\x10\x00\x20\x00' * 5)
+        cls.slow = example('slow.wav', 120, 8000, 1, seconds=1200)
+
+    def test_refusals_before_any_work_leave_every_file_as_it_was(self):
+        same = 'is the same file as'
+        cases = [
+            (('resample', 'a.wav', 'a.wav', '--rate', 48000), 2,
+             f"output 'a.wav' {same} input 'a.wav'; nothing written"),
+            (('resample', 'a.wav', 'a-hard.wav', '--rate', 48000), 2,
+             f"output 'a-hard.wav' {same} input 'a.wav'; nothing written"),
+            (('resample', 'a.wav', 'sub/../a-link.wav', '--rate', 48000), 2,
+             f"output 'sub/../a-link.wav' {same} input 'a.wav'; nothing written"),
+            (('beats', 'a.wav', 'b.wav', '--click', '{}.wav'), 2,
+             f"--click output 'a.wav' {same} input 'a.wav'; nothing written"),
+            (('beats', 'a.wav', 'b.wav', '--click', 'sub/../{}.wav'), 2,
+             f"--click output 'sub/../a.wav' {same} input 'a.wav'; nothing written"),
+            (('beats', 'a.wav', 'sub/a.wav', '--plot', '{}.svg'), 2,
+             "--plot '{}.svg' gives the same name 'a.svg' to two inputs "
+             '(see clipweaver --help)'),
+            (('beats', 'a.wav', '--click', 'a.mp3'), 2,
+             "--click 'a.mp3': unknown output format "
+             '(use .wav, .flac, .ogg, .aiff or .au) (see clipweaver --help)'),
+            (('beats', 'a.wav', '--plot', 'a.png'), 2,
+             "--plot 'a.png' does not end in .svg (see clipweaver --help)"),
+            (('example', 'kept.wav.mp3'), 2,
+             'kept.wav.mp3: unknown output format '
+             '(use .wav, .flac, .ogg, .aiff or .au) (see clipweaver --help)'),
+            # 11 GB of samples: past what AIFF's 32-bit sizes hold.
+            (('example', 'kept.aiff', '--seconds', 3600, '--rate', 768000), 1,
+             'kept.aiff: cannot write: too long for .aiff (it holds at most '
+             '1398.10 s at this rate and channel count); use .wav, .flac or .ogg'),
+            (('beats', 'pipe.wav'), 1,
+             'pipe.wav: is a named pipe, not a regular file '
+             '(sound files are read with seeks)'),
+            (('resample', 'a.wav', 'no/dir/out.wav', '--rate', 48000), 1,
+             'no/dir/out.wav: cannot write: no such directory'),
+            (('resample', 'a.wav', 'pipe.wav', '--rate', 48000), 1,
+             'pipe.wav: cannot write: exists and is not a regular file'),
+        ]
+        before = {name: digest(name) for name in ('a.wav', 'b.wav', 'kept.wav')}
+        files = listing()
+        for args, status, message in cases:
+            with self.subTest(args):
+                done = run(*args, timeout=20)
+                self.assertEqual((done.returncode, done.stderr),
+                                 (status, f'clipweaver: {message}\n'))
+                self.assertEqual(listing(), files)
+        self.assertEqual({name: digest(name) for name in before}, before)
+
+    def test_one_hertz_to_768_khz_runs_in_bounded_memory(self):
+        done = run('resample', 'one-hertz.wav', 'up.wav', '--rate', 768000,
+                   memory=256 << 20, timeout=60)
+        self.assertEqual(done.returncode, 0, done.stderr)
+        channels, rate, samples = read_wav('up.wav')
+        self.assertEqual((channels, rate, len(samples)), (2, 768000, 2 * 5 * 768000))
+
+    def test_ctrl_c_in_any_phase_leaves_nothing_and_says_what_stopped(self):
+        def partial(name, header):
+            def ready(process):
+                with open(wait_for_partial(name, 4), 'rb') as f:
+                    self.assertEqual(f.read(4), header)
+            return ready
+
+        def first_result(process):
+            self.assertIn('a.wav: 120.00 BPM', process.stdout.readline())
+
+        # (arguments, when to press Ctrl-C, last line, what sub/ holds then)
+        cases = [
+            # 4.6 GB of samples: the WAV goes out as RF64 from its first byte.
+            (('example', 'huge.wav', '--seconds', 1500, '--rate', 768000),
+             partial('huge.wav', b'RF64'),
+             'writing of huge.wav stopped; nothing written', []),
+            (('resample', 'slow.wav', 'kept.wav', '--rate', 768000),
+             partial('kept.wav', b'RIFF'),
+             'resampling of slow.wav stopped; nothing written', []),
+            (('beats', '-q', '-j1', 'a.wav', 'slow.wav', '--plot', 'sub/{}.svg'),
+             first_result, 'analysis of slow.wav stopped; '
+             '1 of 2 files done, no output left from the others', ['a.svg']),
+        ]
+        for args, ready, message, kept_in_sub in cases:
+            with self.subTest(args):
+                files, kept = listing(), digest('kept.wav')
+                process = start(*args)
+                ready(process)
+                process.send_signal(signal.SIGINT)
+                _, errors = process.communicate(timeout=20)
+                self.assertEqual(process.returncode, 130)
+                self.assertEqual(errors, f'clipweaver: interrupted: {message}\n')
+                self.assertEqual(listing(), files)
+                self.assertEqual(os.listdir(path('sub')), kept_in_sub)
+                self.assertEqual(digest('kept.wav'), kept)
+
+    def test_truncated_file_is_analysed_with_a_warning(self):
+        with open(example('ten.wav', seconds=10, channels=1), 'rb') as f:
+            data = f.read()
+        with open(path('cut.wav'), 'wb') as f:
+            f.write(data[:44 + 2 * 147000])
+        done = run('beats', 'cut.wav')
+        self.assertEqual(done.returncode, 0)
+        self.assertTrue(done.stdout.startswith('cut.wav: 120.00 BPM, 7 beats in 3.33 s'))
+        self.assertEqual(done.stderr, 'clipweaver: cut.wav: warning: truncated: 3.33 s '
+                         'present of 10.00 s announced; analysed what is there\n')
+
+    def test_control_characters_in_names_are_escaped(self):
+        name = 'x\ny\x1b[31m\x9b.wav'
+        os.link(self.a, path(name))
+        done = run('beats', name, 'gone\r.wav')
+        self.assertEqual(done.returncode, 1)
+        self.assertTrue(done.stdout.startswith(
+            'x\\ny\\x1B[31m\\xC2\\x9B.wav: 120.00 BPM'), done.stdout)
+        self.assertEqual(done.stderr, 'clipweaver: gone\\r.wav: no such file\n')
+
+
+if __name__ == '__main__':
+    main()
