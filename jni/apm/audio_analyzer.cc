@@ -4,6 +4,7 @@
 
 #include <algorithm>
 #include <cmath>
+#include <cstdint>
 #include <cstring>
 
 #include "base/logging.h"
@@ -49,8 +50,9 @@ bool NormalizeDetectionFunction(std::vector<float>* values) {
   return true;
 }
 
-AudioAnalyzer::AudioAnalyzer(int32_t sample_rate)
+AudioAnalyzer::AudioAnalyzer(int32_t sample_rate, const ApmConfig& config)
     : sample_rate_(sample_rate),
+      config_(config),
       spectrogram_calculator_(kWindowLengthSeconds, kOverlapSeconds) {}
 
 AudioAnalyzer::~AudioAnalyzer() = default;
@@ -58,44 +60,131 @@ AudioAnalyzer::~AudioAnalyzer() = default;
 int32_t AudioAnalyzer::CalculateBeats(
     const uint8_t* data, int32_t size_in_bytes, int32_t channel_count,
     std::function<bool(char)> progress_callback) {
-  const std::function<bool(float)> stage_progress =
-      [this, progress_callback](float fraction) {
-        const float overall = std::fma(fraction, 33.0f,
-                                       static_cast<float>(33 * stage_));
-        return progress_callback &&
-               progress_callback(static_cast<char>(static_cast<int>(overall)));
-      };
-  ReleaseBeats();
-  tracker_.reset();
-  if (!MixDownToMono(data, size_in_bytes, channel_count)) return -1;
-  if (!RunPipeline(stage_progress)) return -1;
-  return GetBeats();
+  const int64_t frame_size = 2 * static_cast<int64_t>(channel_count);
+  const int64_t frame_count =
+      channel_count < 1 || data == nullptr || size_in_bytes < frame_size
+          ? 0
+          : size_in_bytes / frame_size;
+  if (Begin(channel_count, frame_count, std::move(progress_callback))) {
+    MixAndAnalyse(data, static_cast<int32_t>(frame_count));
+  }
+  return Finish();
 }
 
-void AudioAnalyzer::ReleaseBeats() { beats_.reset(); }
-
-// Only checks and sizes the input: the samples are mixed block by block as
-// the spectrogram consumes them.
-bool AudioAnalyzer::MixDownToMono(const uint8_t* data, int32_t size_in_bytes,
-                                  int32_t channel_count) {
+bool AudioAnalyzer::Begin(int32_t channel_count, int64_t frame_count,
+                          std::function<bool(char)> progress) {
+  beats_.reset();
+  tracker_.reset();
+  detection_function_.clear();
+  running_ = false;
+  frames_fed_ = 0;
+  progress_ = std::move(progress);
   if (channel_count < 1) {
     LOG(ERROR) << "Channels are less than one!";
     return false;
   }
-  const int64_t frame_size = 2 * static_cast<int64_t>(channel_count);
-  sample_count_ = data == nullptr || size_in_bytes < frame_size
-                      ? 0
-                      : static_cast<int32_t>(size_in_bytes / frame_size);
-  pcm_ = data;
   channel_count_ = channel_count;
-  LOG(INFO) << "Input samples size: " << sample_count_;
-  return sample_count_ > 0;
+  length_known_ = frame_count >= 0;
+  if (length_known_) {
+    LOG(INFO) << "Input samples size: " << frame_count;
+    if (frame_count == 0) return false;
+  }
+  StartSpectrogram(frame_count);
+  running_ = true;
+  return true;
 }
 
-bool AudioAnalyzer::RunPipeline(
-    const std::function<bool(float)>& stage_progress) {
-  if (!ComputeDetectionFunction(stage_progress)) return false;
+bool AudioAnalyzer::Feed(const int16_t* interleaved, int32_t frame_count) {
+  // Native 16-bit samples are the little-endian bytes the mix-down reads.
+  static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__,
+                "the mix-down reads little-endian samples");
+  if (!running_) return false;
+  return MixAndAnalyse(reinterpret_cast<const uint8_t*>(interleaved),
+                       frame_count);
+}
 
+int32_t AudioAnalyzer::Finish() {
+  if (!running_) return -1;
+  running_ = false;
+  spectrogram_calculator_.EndStream();
+  if (!length_known_) {
+    LOG(INFO) << "Input samples size: " << frames_fed_;
+    if (frames_fed_ == 0) return -1;
+  }
+  if (!FinishOnsetStage()) return -1;
+  Track();
+  return GetBeats();
+}
+
+std::function<bool(float)> AudioAnalyzer::StageProgress(int32_t stage) const {
+  return [this, stage](float fraction) {
+    const float overall =
+        std::fma(fraction, 33.0f, static_cast<float>(33 * stage));
+    // A stream longer than announced would run into the next stage's bytes.
+    const int byte = std::min(static_cast<int>(overall), 33 * stage + 32);
+    return progress_ && progress_(static_cast<char>(byte));
+  };
+}
+
+// The spectrogram and the onset detector run side by side over the blocks
+// of the input, frame by frame, so neither the mono signal nor the
+// spectrogram is ever held whole.
+void AudioAnalyzer::StartSpectrogram(int64_t frame_count) {
+  spectrogram_calculator_.Initialize(static_cast<double>(sample_rate_));
+  frames_per_second_ = spectrogram_calculator_.frames_per_second();
+  frame_.resize(spectrogram_calculator_.bin_count());
+  onset_detector_.Reset(spectrogram_calculator_.bin_count());
+  // Progress only: a length past the 32-bit range reports it approximately.
+  spectrogram_calculator_.BeginStream(static_cast<int32_t>(std::min<int64_t>(
+      std::max<int64_t>(frame_count, 0), INT32_MAX)));
+  spectrogram_progress_ = StageProgress(0);
+  detect_ = [this](const double* bins) {
+    for (size_t k = 0; k < frame_.size(); ++k) {
+      frame_[k] = {static_cast<float>(bins[2 * k]),
+                   static_cast<float>(bins[2 * k + 1])};
+    }
+    detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
+  };
+}
+
+bool AudioAnalyzer::MixAndAnalyse(const uint8_t* interleaved,
+                                  int32_t frame_count) {
+  const int64_t frame_size = 2 * static_cast<int64_t>(channel_count_);
+  while (frame_count > 0) {
+    const int32_t count = std::min(kBlockFrames, frame_count);
+    if (samples_.size() < static_cast<size_t>(count)) samples_.resize(count);
+    for (int32_t i = 0; i < count; ++i, interleaved += frame_size) {
+      float sum = 0;
+      for (int32_t c = 0; c < channel_count_; ++c) {
+        sum += static_cast<float>(ReadSample(interleaved + 2 * c));
+      }
+      samples_[i] = sum / static_cast<float>(channel_count_);
+    }
+    if (!spectrogram_calculator_.StreamBlock(samples_.data(), count,
+                                             spectrogram_progress_, detect_)) {
+      LOG(ERROR) << "Spectrogram process failed!";
+      running_ = false;
+      return false;
+    }
+    frames_fed_ += count;
+    frame_count -= count;
+  }
+  return true;
+}
+
+// The detector already saw every frame; its stage's progress reports and
+// cancellation point follow the spectrogram, where a separate pass over the
+// stored frames would make them.
+bool AudioAnalyzer::FinishOnsetStage() {
+  const int32_t frame_count = static_cast<int32_t>(detection_function_.size());
+  if (!onset_detector_.ReplayPass(frame_count, StageProgress(1))) {
+    LOG(ERROR) << "Onset process failed!";
+    return false;
+  }
+  return true;
+}
+
+void AudioAnalyzer::Track() {
   SubtractRunningMedian(2 * frames_per_second_ + 1, &detection_function_);
   const bool has_onsets = NormalizeDetectionFunction(&detection_function_);
   LOG(INFO) << "Preprocess done. apm input size: "
@@ -103,66 +192,11 @@ bool AudioAnalyzer::RunPipeline(
   if (!has_onsets) {
     LOG(ERROR) << "No onsets above the running median (silent or steady "
                   "input): no beats to track.";
-    return true;
+    return;
   }
-
-  const ApmConfig config;
-  tracker_ = std::make_unique<Apm>(config, detection_function_,
+  tracker_ = std::make_unique<Apm>(config_, detection_function_,
                                    frames_per_second_);
-  stage_ = 2;
-  tracker_->Run(stage_progress);
-  return true;
-}
-
-// The spectrogram and the onset detector run side by side over blocks of
-// the input, frame by frame, so neither the mono signal nor the spectrogram
-// is ever held whole. The onset stage's progress reports and its
-// cancellation point follow once the spectrogram is done, exactly where a
-// separate pass over the stored frames would make them.
-bool AudioAnalyzer::ComputeDetectionFunction(
-    const std::function<bool(float)>& stage_progress) {
-  stage_ = 0;
-  spectrogram_calculator_.Initialize(static_cast<double>(sample_rate_));
-  frames_per_second_ = spectrogram_calculator_.frames_per_second();
-  detection_function_.clear();
-  frame_.resize(spectrogram_calculator_.bin_count());
-  onset_detector_.Reset(spectrogram_calculator_.bin_count());
-
-  const auto detect = [this](const double* bins) {
-    for (size_t k = 0; k < frame_.size(); ++k) {
-      frame_[k] = {static_cast<float>(bins[2 * k]),
-                   static_cast<float>(bins[2 * k + 1])};
-    }
-    detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
-  };
-  spectrogram_calculator_.BeginStream(sample_count_);
-  samples_.resize(std::min(sample_count_, kBlockFrames));
-  const int64_t frame_size = 2 * static_cast<int64_t>(channel_count_);
-  for (int32_t first = 0; first < sample_count_; first += kBlockFrames) {
-    const int32_t count = std::min(kBlockFrames, sample_count_ - first);
-    const uint8_t* frame = pcm_ + first * frame_size;
-    for (int32_t i = 0; i < count; ++i, frame += frame_size) {
-      float sum = 0;
-      for (int32_t c = 0; c < channel_count_; ++c) {
-        sum += static_cast<float>(ReadSample(frame + 2 * c));
-      }
-      samples_[i] = sum / static_cast<float>(channel_count_);
-    }
-    if (!spectrogram_calculator_.StreamBlock(samples_.data(), count,
-                                             stage_progress, detect)) {
-      LOG(ERROR) << "Spectrogram process failed!";
-      return false;
-    }
-  }
-  spectrogram_calculator_.EndStream();
-
-  stage_ = 1;
-  const int32_t frame_count = static_cast<int32_t>(detection_function_.size());
-  if (!onset_detector_.ReplayPass(frame_count, stage_progress)) {
-    LOG(ERROR) << "Onset process failed!";
-    return false;
-  }
-  return true;
+  tracker_->Run(StageProgress(2));
 }
 
 int32_t AudioAnalyzer::GetBeats() {

@@ -2,6 +2,7 @@
 
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cmath>
 #include <cstring>
 
@@ -117,6 +118,50 @@ TEST(AudioAnalyzer, StreamingGivesTheDetectionFunctionOfTheWholeSignal) {
   for (size_t i = bytes.size() + 1; i < run.progress.size(); ++i) {
     EXPECT_GT(run.progress[i], run.progress[i - 1]);
     EXPECT_LE(run.progress[i], 98);
+  }
+}
+
+Outcome Stream(const std::vector<uint8_t>& pcm, int rate, int channels, int32_t block,
+               int64_t announced) {
+  std::vector<int16_t> samples(pcm.size() / 2);
+  std::memcpy(samples.data(), pcm.data(), 2 * samples.size());
+  const int32_t frames = static_cast<int32_t>(samples.size() / channels);
+  Outcome run;
+  AudioAnalyzer analyzer(rate);
+  testing::internal::CaptureStderr();
+  EXPECT_TRUE(analyzer.Begin(channels, announced, [&](char p) {
+    run.progress.push_back(p);
+    return false;
+  }));
+  for (int32_t first = 0; first < frames; first += block) {
+    EXPECT_TRUE(analyzer.Feed(&samples[static_cast<size_t>(first) * channels],
+                              std::min(block, frames - first)));
+  }
+  run.count = analyzer.Finish();
+  run.log = testing::internal::GetCapturedStderr();
+  if (run.count > 0) run.beats.assign(analyzer.beats(), analyzer.beats() + run.count);
+  return run;
+}
+
+TEST(AudioAnalyzer, StreamedBlocksGiveTheWholeBufferRun) {
+  const int rate = 22050;
+  const std::vector<uint8_t> pcm = Clicks(30, rate, 2, 0.5);
+  const int64_t frames = static_cast<int64_t>(pcm.size() / 4);
+  const Outcome whole = Analyze(pcm, static_cast<int32_t>(pcm.size()), rate, 2);
+  ASSERT_GT(whole.count, 50);
+  for (int32_t block : {1, 7, 441, 4096, 65536}) {
+    const Outcome run = Stream(pcm, rate, 2, block, frames);
+    EXPECT_EQ(run.count, whole.count) << block;
+    EXPECT_EQ(run.beats, whole.beats) << block;
+    EXPECT_EQ(run.progress, whole.progress) << block;
+    EXPECT_EQ(run.log, whole.log) << block;
+  }
+  // A wrong or unknown length only moves the progress bytes, never backwards.
+  for (int64_t announced : {frames / 3, 3 * frames, int64_t{-1}}) {
+    const Outcome run = Stream(pcm, rate, 2, 4096, announced);
+    EXPECT_EQ(run.beats, whole.beats) << announced;
+    EXPECT_TRUE(std::is_sorted(run.progress.begin(), run.progress.end())) << announced;
+    EXPECT_LE(run.progress.back(), 98);
   }
 }
 
