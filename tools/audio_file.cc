@@ -164,8 +164,9 @@ bool AudioReader::Open(const std::string& path, std::string* error) {
     *error = "unsupported format (no channels or no sample rate)";
     return false;
   }
-  const int64_t decoded = info_.frames > 0 && info_.frames < SF_COUNT_MAX ? info_.frames : -1;
-  announced_frames_ = std::max(announced, decoded);
+  frames_ = info_.frames >= 0 && info_.frames < SF_COUNT_MAX ? info_.frames : -1;
+  announced_frames_ = std::max(announced, frames_);
+  file_size_ = status.st_size;
   return true;
 }
 
@@ -176,11 +177,16 @@ int64_t AudioReader::Read(int16_t* frames, int64_t count) {
   return got;
 }
 
+double AudioReader::fraction_read() const {
+  const off_t position = lseek(fd_, 0, SEEK_CUR);
+  return position <= 0 ? 0.0 : std::min(1.0, static_cast<double>(position) / file_size_);
+}
+
 std::string AudioReader::ShortfallWarning() const {
   if (announced_frames_ <= frames_read_) return std::string();
   const double rate = info_.samplerate;
   return "truncated: " + Seconds(frames_read_ / rate) + " present of " +
-         Seconds(announced_frames_ / rate) + " announced; analysed what is there";
+         Seconds(announced_frames_ / rate) + " announced";
 }
 
 AudioWriter::~AudioWriter() {
@@ -251,39 +257,6 @@ bool AudioWriter::Close(std::string* error) {
     return false;
   }
   return output_.Commit(error);
-}
-
-bool DecodeFile(const std::string& path, const std::atomic<bool>& stop,
-                DecodedAudio* audio, std::string* error) {
-  AudioReader reader;
-  if (!reader.Open(path, error)) return false;
-  audio->sample_rate = reader.sample_rate();
-  audio->channels = reader.channels();
-  audio->samples.clear();
-  constexpr int64_t kChunkFrames = 1 << 16;
-  const size_t chunk = static_cast<size_t>(kChunkFrames * audio->channels);
-  if (reader.frames() > 0 && reader.frames() < (int64_t{1} << 28)) {
-    audio->samples.reserve(static_cast<size_t>(reader.frames() * audio->channels));
-  }
-  size_t used = 0;
-  for (;;) {
-    if (stop.load()) {
-      *error = "interrupted";
-      return false;
-    }
-    audio->samples.resize(used + chunk);
-    const int64_t got = reader.Read(audio->samples.data() + used, kChunkFrames);
-    used += static_cast<size_t>(got * audio->channels);
-    if (got < kChunkFrames) break;
-  }
-  audio->samples.resize(used);
-  audio->samples.shrink_to_fit();
-  if (used == 0) {
-    *error = "no audio (the file holds no samples)";
-    return false;
-  }
-  audio->warning = reader.ShortfallWarning();
-  return true;
 }
 
 }  // namespace cwtool

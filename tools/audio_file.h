@@ -4,7 +4,6 @@
 
 #include <sndfile.h>
 
-#include <atomic>
 #include <cstdint>
 #include <string>
 #include <vector>
@@ -18,8 +17,6 @@ struct DecodedAudio {
   int32_t sample_rate = 0;
   int32_t channels = 0;
   std::vector<int16_t> samples;  // interleaved
-  // Set when the header announced more than the file holds.
-  std::string warning;
 
   int64_t frames() const {
     return channels > 0 ? static_cast<int64_t>(samples.size()) / channels : 0;
@@ -41,8 +38,10 @@ class AudioReader {
   bool Open(const std::string& path, std::string* error);
   int32_t sample_rate() const { return info_.samplerate; }
   int32_t channels() const { return info_.channels; }
-  // As the header claims, at least; -1 when unknown.
-  int64_t frames() const { return announced_frames_; }
+  // What the decoder expects to deliver; -1 when unknown.
+  int64_t frames() const { return frames_; }
+  // 0..1, by the bytes consumed so far, for when frames() is unknown.
+  double fraction_read() const;
   // Frames read into `frames` (room for count * channels() samples); 0 at
   // the end or on a decoding error.
   int64_t Read(int16_t* frames, int64_t count);
@@ -54,8 +53,10 @@ class AudioReader {
   int fd_ = -1;
   SNDFILE* file_ = nullptr;
   SF_INFO info_{};
+  int64_t frames_ = -1;
   int64_t announced_frames_ = -1;
   int64_t frames_read_ = 0;
+  int64_t file_size_ = 0;
 };
 
 class AudioWriter {
@@ -85,11 +86,6 @@ class AudioWriter {
   int64_t frames_written_ = 0;
   std::string extension_;
 };
-
-// Reads all of path. Gives up with the error "interrupted" as soon as
-// *stop is set.
-bool DecodeFile(const std::string& path, const std::atomic<bool>& stop,
-                DecodedAudio* audio, std::string* error);
 
 // The libsndfile container for an output file name, or 0 for an extension
 // it does not know. The length decides between WAV and RF64 later.

@@ -2,7 +2,6 @@
 
 #include <cmath>
 #include <cstdio>
-#include <limits>
 
 #include "jni/apm/audio_analyzer.h"
 #include "tools/audio_file.h"
@@ -14,10 +13,11 @@
 namespace cwtool {
 namespace {
 
-// The analyzer reads little-endian bytes; the decoded samples are handed
-// over as they lie in memory.
-static_assert(__BYTE_ORDER__ == __ORDER_LITTLE_ENDIAN__,
-              "PCM is passed to the analyzer in host byte order");
+// Large enough that decoding and feeding cost little per call, small
+// enough to stay out of the memory figures.
+constexpr int32_t kBlockFrames = 1 << 14;
+// The analyzer's spectrogram stage takes bytes 0..32 of its 0..98.
+constexpr int kSpectrogramPercent = 33;
 
 std::string Seconds(double seconds) {
   char text[32];
@@ -25,32 +25,22 @@ std::string Seconds(double seconds) {
   return text;
 }
 
-std::string CheckLength(const DecodedAudio& audio) {
-  if (audio.seconds() < kMinimumSeconds) {
-    return "too short to analyse (" + Seconds(audio.seconds()) +
-           "; at least " + Seconds(kMinimumSeconds) + " needed)";
-  }
-  const double max_bytes = std::numeric_limits<int32_t>::max();
-  if (2.0 * static_cast<double>(audio.samples.size()) > max_bytes) {
-    const double max_seconds =
-        max_bytes / (2.0 * audio.channels * audio.sample_rate);
-    return "too long to analyse (" + Seconds(audio.seconds()) +
-           "; at most " + Seconds(max_seconds) + " at this rate and channel count)";
-  }
-  return std::string();
+std::string TooShort(double seconds) {
+  return "too short to analyse (" + Seconds(seconds) + "; at least " +
+         Seconds(kMinimumSeconds) + " needed)";
 }
 
-std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& audio,
+std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& plotted,
                         const apm::AudioAnalyzer& analyzer,
                         const BeatResult& result) {
   std::string error;
   if (!extras.click_path.empty() &&
-      !WriteClickTrack(extras.click_path, audio, result.beats, &error)) {
-    return extras.click_path + ": " + error;
+      !WriteClickTrack(extras.click_path, result.path, result.beats, &error)) {
+    return Interrupted() ? std::string() : extras.click_path + ": " + error;
   }
   if (!extras.plot_path.empty()) {
     const BeatPlot plot{result.path,
-                        &audio,
+                        &plotted,
                         &analyzer.detection_function(),
                         analyzer.frames_per_second(),
                         &result.beats,
@@ -66,31 +56,65 @@ std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& audio,
 
 BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
                        const std::function<void(int)>& progress) {
-  const std::atomic<bool>& stop = InterruptFlag();
   BeatResult result;
   result.path = path;
-  DecodedAudio audio;
-  if (!DecodeFile(path, stop, &audio, &result.error)) {
-    result.interrupted = stop.load();
+  AudioReader reader;
+  if (!reader.Open(path, &result.error)) return result;
+  result.sample_rate = reader.sample_rate();
+  result.channels = reader.channels();
+  const int64_t minimum_frames =
+      static_cast<int64_t>(std::ceil(kMinimumSeconds * result.sample_rate));
+  if (reader.frames() >= 0 && reader.frames() < minimum_frames) {
+    result.error = reader.frames() == 0
+                       ? "no audio (the file holds no samples)"
+                       : TooShort(static_cast<double>(reader.frames()) / result.sample_rate);
     return result;
   }
-  result.sample_rate = audio.sample_rate;
-  result.channels = audio.channels;
-  result.duration = audio.seconds();
-  result.warning = audio.warning;
-  result.error = CheckLength(audio);
-  if (!result.error.empty()) return result;
 
-  apm::AudioAnalyzer analyzer(audio.sample_rate);
-  const int32_t count = analyzer.CalculateBeats(
-      reinterpret_cast<const uint8_t*>(audio.samples.data()),
-      static_cast<int32_t>(2 * audio.samples.size()), audio.channels,
-      [&](char byte) {
-        progress(static_cast<unsigned char>(byte) * 100 / 99);
-        return stop.load();
-      });
+  // The decoding drives the first stage; where the length is unknown, the
+  // analyzer cannot tell how far it is and the bytes read stand in.
+  const bool length_known = reader.frames() >= 0;
+  apm::AudioAnalyzer analyzer(result.sample_rate);
+  const auto analyzer_progress = [&](char byte) {
+    progress(static_cast<unsigned char>(byte) * 100 / 99);
+    return Interrupted();
+  };
+  if (!analyzer.Begin(result.channels, reader.frames(), analyzer_progress)) {
+    result.error = "the analysis failed (see --verbose for its log)";
+    return result;
+  }
+  // The plot draws its waveform from the whole signal.
+  DecodedAudio plotted;
+  plotted.sample_rate = result.sample_rate;
+  plotted.channels = result.channels;
+  std::vector<int16_t> block(static_cast<size_t>(kBlockFrames) * result.channels);
+  int64_t frames = 0;
+  for (int64_t got; (got = reader.Read(block.data(), kBlockFrames)) > 0;) {
+    frames += got;
+    if (!analyzer.Feed(block.data(), static_cast<int32_t>(got))) break;
+    if (!extras.plot_path.empty()) {
+      plotted.samples.insert(plotted.samples.end(), block.begin(),
+                             block.begin() + got * result.channels);
+    }
+    if (!length_known) progress(static_cast<int>(kSpectrogramPercent * reader.fraction_read()));
+  }
+  if (Interrupted()) {
+    result.interrupted = true;
+    return result;
+  }
+  result.duration = static_cast<double>(frames) / result.sample_rate;
+  if (frames == 0) {
+    result.error = "no audio (the file holds no samples)";
+    return result;
+  }
+  if (frames < minimum_frames) {
+    result.error = TooShort(result.duration);
+    return result;
+  }
+  result.warning = reader.ShortfallWarning();
+  const int32_t count = analyzer.Finish();
   // A cancelled tracking stage still returns a count (of 0).
-  if (stop.load()) {
+  if (Interrupted()) {
     result.interrupted = true;
     return result;
   }
@@ -102,8 +126,8 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   if (count >= 2 && std::isfinite(analyzer.bpm()) && analyzer.bpm() > 0) {
     result.bpm = analyzer.bpm();
   }
-  result.output_error = WriteExtras(extras, audio, analyzer, result);
-  if (stop.load()) {
+  result.output_error = WriteExtras(extras, plotted, analyzer, result);
+  if (Interrupted()) {
     result.interrupted = true;
     return result;
   }

@@ -91,7 +91,10 @@ int RunBeats(const BeatsOptions& options) {
         continue;
       }
       ++finished;
-      if (!r.warning.empty()) console.Message("clipweaver: " + r.path + ": warning: " + r.warning);
+      if (!r.warning.empty()) {
+        console.Message("clipweaver: " + r.path + ": warning: " + r.warning +
+                        "; analysed what is there");
+      }
       if (!r.error.empty()) {
         ++failures;
         console.Message("clipweaver: " + r.path + ": " + r.error);

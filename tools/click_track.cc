@@ -4,6 +4,7 @@
 #include <cmath>
 #include <cstdint>
 
+#include "tools/audio_file.h"
 #include "tools/interrupt.h"
 
 namespace cwtool {
@@ -30,29 +31,30 @@ std::vector<float> ClickShape(int32_t sample_rate) {
 
 }  // namespace
 
-bool WriteClickTrack(const std::string& path, const DecodedAudio& audio,
+bool WriteClickTrack(const std::string& path, const std::string& input,
                      const std::vector<float>& beats, std::string* error) {
+  AudioReader reader;
+  if (!reader.Open(input, error)) return false;
+  const int32_t sample_rate = reader.sample_rate();
+  const int channels = reader.channels();
   AudioWriter writer;
-  if (!writer.Open(path, audio.sample_rate, audio.channels, audio.frames(), error)) {
-    return false;
-  }
-  const std::vector<float> click = ClickShape(audio.sample_rate);
+  if (!writer.Open(path, sample_rate, channels, reader.frames(), error)) return false;
+  const std::vector<float> click = ClickShape(sample_rate);
   const int64_t click_frames = static_cast<int64_t>(click.size());
   std::vector<int64_t> starts;
   for (const float beat : beats) {
-    starts.push_back(std::llround(static_cast<double>(beat) * audio.sample_rate));
+    starts.push_back(std::llround(static_cast<double>(beat) * sample_rate));
   }
 
-  const int64_t frames = audio.frames();
-  const int channels = audio.channels;
+  std::vector<int16_t> music(static_cast<size_t>(kBlockFrames * channels));
   std::vector<float> mix;
   std::vector<int16_t> block;
   size_t first_beat = 0;
-  for (int64_t begin = 0; begin < frames; begin += kBlockFrames) {
+  for (int64_t begin = 0, got; (got = reader.Read(music.data(), kBlockFrames)) > 0;
+       begin += got) {
     if (Interrupted()) return false;
-    const int64_t end = std::min(frames, begin + kBlockFrames);
-    mix.assign(audio.samples.begin() + begin * channels,
-               audio.samples.begin() + end * channels);
+    const int64_t end = begin + got;
+    mix.assign(music.begin(), music.begin() + got * channels);
     for (float& sample : mix) sample *= kMusicGain;
     while (first_beat < starts.size() &&
            starts[first_beat] + click_frames <= begin) {

@@ -5,13 +5,12 @@
 #include <string>
 #include <vector>
 
-#include "tools/audio_file.h"
-
 namespace cwtool {
 
-// Same rate and channels as the input; the container follows the
-// extension of path. Stops, writing nothing, on Ctrl-C.
-bool WriteClickTrack(const std::string& path, const DecodedAudio& audio,
+// A second pass over the input file, block by block; same rate and channels
+// as the input, the container following the extension of path. Stops,
+// writing nothing, on Ctrl-C.
+bool WriteClickTrack(const std::string& path, const std::string& input,
                      const std::vector<float>& beats, std::string* error);
 
 }  // namespace cwtool

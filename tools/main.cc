@@ -37,7 +37,7 @@ int Resample(const cwtool::ResampleSettings& settings) {
   int64_t frames = 0;
   std::string warning, error;
   const bool done = cwtool::ResampleFile(settings, &frames, &warning, &error);
-  if (!warning.empty()) Say(settings.input + ": warning: " + warning);
+  if (!warning.empty()) Say(settings.input + ": warning: " + warning + "; converted what is there");
   return done ? 0 : Finish(error, "resampling of " + settings.input + " stopped");
 }
 
