@@ -4,6 +4,7 @@
 #include <cerrno>
 #include <cmath>
 #include <cstdlib>
+#include <getopt.h>
 #include <map>
 #include <set>
 
@@ -12,21 +13,72 @@
 namespace cwtool {
 namespace {
 
+enum Command { kBeatsCommand, kResampleCommand, kExampleCommand };
+
+// Every option of every command, with its help; the parser and the help
+// text are made from this table alone.
 struct OptionSpec {
+  Command command;
   const char* name;
-  char short_name;  // 0: none
-  bool takes_value;
+  char short_name;    // 0: none
+  const char* value;  // what the option takes, as the help names it; null: a flag
+  const char* help;   // lines after the first are indented under it
 };
 
-const std::vector<OptionSpec> kBeatsOptions = {
-    {"format", 0, true}, {"jobs", 'j', true},  {"quiet", 'q', false},
-    {"verbose", 'v', false}, {"click", 0, true}, {"plot", 0, true},
-    {"help", 'h', false}};
-const std::vector<OptionSpec> kResampleOptions = {
-    {"rate", 0, true}, {"gain", 0, true}, {"help", 'h', false}};
-const std::vector<OptionSpec> kExampleOptions = {
-    {"bpm", 0, true}, {"seconds", 0, true}, {"rate", 0, true},
-    {"channels", 0, true}, {"help", 'h', false}};
+constexpr OptionSpec kOptions[] = {
+    {kBeatsCommand, "format", 0, "F",
+     "text (default), csv (file,tempo_bpm,beat,time_s) or json\n"
+     "(one object per file and line)"},
+    {kBeatsCommand, "jobs", 'j', "N",
+     "analyse N files at a time (default: one per core); the\n"
+     "results still come in the order of the arguments"},
+    {kBeatsCommand, "click", 0, "OUT",
+     "also write the input mixed with a click on every beat"},
+    {kBeatsCommand, "plot", 0, "OUT.svg",
+     "also draw the waveform, the onset strength and the beats\n"
+     "With several files OUT must hold '{}', which stands for\n"
+     "each input's name without directory and extension."},
+    {kBeatsCommand, "quiet", 'q', nullptr,
+     "no progress bar (it is only drawn when stderr is a terminal)"},
+    {kBeatsCommand, "verbose", 'v', nullptr,
+     "let the analysis log through to stderr (no progress bar)"},
+    {kResampleCommand, "rate", 0, "HZ",
+     "output sample rate (required); at most a 3:1 reduction"},
+    {kResampleCommand, "gain", 0, "L,R",
+     "gains of the left and right channel from -1 to 1\n"
+     "(default 1,1; a mono file takes L)"},
+    {kExampleCommand, "bpm", 0, "BPM", "tempo from 40 to 300 (default 120)"},
+    {kExampleCommand, "seconds", 0, "S", "length (default 20)"},
+    {kExampleCommand, "rate", 0, "HZ", "sample rate (default 44100)"},
+    {kExampleCommand, "channels", 0, "N", "1 or 2 (default 2)"},
+};
+
+struct CommandSpec {
+  Command command;
+  const char* name;
+  const char* usage;  // after the command's name
+  const char* about;  // before the options
+  const char* notes;  // after them; may be empty
+};
+
+constexpr CommandSpec kCommands[] = {
+    {kBeatsCommand, "beats", "[options] FILE...",
+     "prints the tempo and the beat times (in seconds) of each FILE. Any\n"
+     "format libsndfile reads will do: WAV, FLAC, Ogg Vorbis, AIFF, ...",
+     "Files shorter than 1 second are refused, and so are pipes and devices\n"
+     "(sound files are read with seeks). A file shorter than its header\n"
+     "announces is analysed with a warning."},
+    {kResampleCommand, "resample", "IN OUT --rate HZ [--gain L,R]",
+     "converts IN to another sample rate with the linear resampler,\n"
+     "block by block; mono stays mono and stereo stays stereo.",
+     ""},
+    {kExampleCommand, "example", "OUT [--bpm BPM] [--seconds S] [--rate HZ] [--channels N]",
+     "writes the example groove: a kick on every beat, a snare on beats\n"
+     "2 and 4 and a hi-hat on every off-beat, the same on every machine.",
+     ""},
+};
+
+constexpr const char* kHelpOption = "help";
 
 struct Arguments {
   std::map<std::string, std::string> values;  // flags map to ""
@@ -34,73 +86,68 @@ struct Arguments {
   std::string error;
 };
 
-const OptionSpec* FindLong(const std::vector<OptionSpec>& specs,
-                           const std::string& name) {
-  for (const OptionSpec& spec : specs) {
-    if (name == spec.name) return &spec;
-  }
-  return nullptr;
-}
-
-const OptionSpec* FindShort(const std::vector<OptionSpec>& specs, char name) {
-  for (const OptionSpec& spec : specs) {
-    if (spec.short_name != 0 && name == spec.short_name) return &spec;
-  }
-  return nullptr;
-}
-
 // Options may come before, between or after the positional arguments; "--"
-// ends them.
-Arguments Split(const std::vector<std::string>& args,
-                const std::vector<OptionSpec>& specs) {
+// ends them. Short flags group (-qv); a short value may be attached (-j4).
+Arguments Split(Command command, int argc, const char* const* argv) {
+  std::vector<const OptionSpec*> specs;
+  std::vector<option> longs;
+  std::string shorts = ":h";  // ':' first: a missing value is told apart
+  for (const OptionSpec& spec : kOptions) {
+    if (spec.command != command) continue;
+    const int id = static_cast<int>(specs.size()) + 256;
+    longs.push_back({spec.name, spec.value ? required_argument : no_argument, nullptr, id});
+    if (spec.short_name != 0) {
+      shorts += spec.short_name;
+      if (spec.value) shorts += ':';
+    }
+    specs.push_back(&spec);
+  }
+  longs.push_back({kHelpOption, no_argument, nullptr, 'h'});
+  longs.push_back({nullptr, 0, nullptr, 0});
+
+  // getopt_long reorders its argument vector: it gets a copy.
+  std::vector<std::string> words(argv, argv + argc);
+  std::vector<char*> pointers;
+  for (std::string& word : words) pointers.push_back(&word[0]);
+  pointers.push_back(nullptr);
+
   Arguments out;
-  bool options_done = false;
-  for (size_t i = 0; i < args.size() && out.error.empty(); ++i) {
-    const std::string& arg = args[i];
-    if (options_done || arg.size() < 2 || arg[0] != '-') {
-      out.positional.push_back(arg);
-    } else if (arg == "--") {
-      options_done = true;
-    } else if (arg[1] == '-') {
-      const size_t equals = arg.find('=');
-      const std::string name = arg.substr(2, equals == std::string::npos ? std::string::npos : equals - 2);
-      const OptionSpec* spec = FindLong(specs, name);
-      if (spec == nullptr) {
-        out.error = "unknown option '--" + name + "'";
-      } else if (!spec->takes_value) {
-        if (equals != std::string::npos) out.error = "--" + name + " takes no value";
-        out.values[name] = "";
-      } else if (equals != std::string::npos) {
-        out.values[name] = arg.substr(equals + 1);
-      } else if (i + 1 < args.size()) {
-        out.values[name] = args[++i];
-      } else {
-        out.error = "--" + name + " needs a value";
-      }
-    } else {
-      // Short flags may be grouped (-qv); a short option with a value takes
-      // the rest of the word (-j4) or the next word (-j 4).
-      for (size_t k = 1; k < arg.size(); ++k) {
-        const OptionSpec* spec = FindShort(specs, arg[k]);
-        if (spec == nullptr) {
-          out.error = std::string("unknown option '-") + arg[k] + "'";
-          break;
-        }
-        if (!spec->takes_value) {
-          out.values[spec->name] = "";
-          continue;
-        }
-        if (k + 1 < arg.size()) {
-          out.values[spec->name] = arg.substr(k + 1);
-        } else if (i + 1 < args.size()) {
-          out.values[spec->name] = args[++i];
-        } else {
-          out.error = std::string("-") + arg[k] + " needs a value";
-        }
-        break;
+  const auto find = [&](int id) -> const OptionSpec* {
+    for (const OptionSpec* spec : specs) {
+      if (id == spec->short_name ||
+          (id >= 256 && spec == specs[static_cast<size_t>(id - 256)])) {
+        return spec;
       }
     }
+    return nullptr;
+  };
+  opterr = 0;
+  optind = 0;  // a full reset, as a first call
+  for (int id; (id = getopt_long(argc, pointers.data(), shorts.c_str(), longs.data(),
+                                 nullptr)) != -1;) {
+    const std::string word = pointers[static_cast<size_t>(optind - 1)];
+    if (id == 'h') {
+      out.values[kHelpOption] = "";
+    } else if (id == ':') {
+      const OptionSpec* spec = find(optopt);
+      out.error = (spec && optopt < 256 ? std::string("-") + spec->short_name
+                                        : word) + " needs a value";
+      return out;
+    } else if (id == '?') {
+      const std::string name = word.substr(0, word.find('='));
+      if (optopt != 0 && optopt < 256) {
+        out.error = std::string("unknown option '-") + static_cast<char>(optopt) + "'";
+      } else if (word.find('=') != std::string::npos && find(optopt)) {
+        out.error = name + " takes no value";
+      } else {
+        out.error = "unknown option '" + name + "'";
+      }
+      return out;
+    } else {
+      out.values[find(id)->name] = optarg ? optarg : "";
+    }
   }
+  out.positional.assign(pointers.begin() + optind, pointers.end() - 1);
   return out;
 }
 
@@ -237,44 +284,46 @@ std::string ParseExample(const Arguments& a, GrooveSettings* out, std::string* p
 
 CommandLine ParseCommandLine(int argc, const char* const* argv) {
   CommandLine line;
-  const std::vector<std::string> args(argv + std::min(argc, 2), argv + argc);
-  const std::string command = argc > 1 ? argv[1] : "";
-  if (command == "--help" || command == "-h" || command == "help") {
+  const std::string name = argc > 1 ? argv[1] : "";
+  if (name == "--help" || name == "-h" || name == "help") {
     line.action = CommandLine::Action::kHelp;
     return line;
   }
-  if (command == "--version") {
+  if (name == "--version") {
     line.action = CommandLine::Action::kVersion;
     return line;
   }
-  const std::vector<OptionSpec>* specs =
-      command == "beats"      ? &kBeatsOptions
-      : command == "resample" ? &kResampleOptions
-      : command == "example"  ? &kExampleOptions
-                              : nullptr;
-  if (specs == nullptr) {
-    line.error = command.empty() ? "no command given"
-                                 : "unknown command '" + command + "'";
+  const CommandSpec* command = nullptr;
+  for (const CommandSpec& spec : kCommands) {
+    if (name == spec.name) command = &spec;
+  }
+  if (command == nullptr) {
+    line.error = name.empty() ? "no command given" : "unknown command '" + name + "'";
     return line;
   }
-  const Arguments parsed = Split(args, *specs);
+  // The command's name stands where getopt expects the program's.
+  const Arguments parsed = Split(command->command, argc - 1, argv + 1);
   if (!parsed.error.empty()) {
     line.error = parsed.error;
     return line;
   }
-  if (parsed.values.count("help")) {
+  if (parsed.values.count(kHelpOption)) {
     line.action = CommandLine::Action::kHelp;
     return line;
   }
-  if (command == "beats") {
-    line.error = ParseBeats(parsed, &line.beats);
-    line.action = CommandLine::Action::kBeats;
-  } else if (command == "resample") {
-    line.error = ParseResample(parsed, &line.resample);
-    line.action = CommandLine::Action::kResample;
-  } else {
-    line.error = ParseExample(parsed, &line.example, &line.example_path);
-    line.action = CommandLine::Action::kExample;
+  switch (command->command) {
+    case kBeatsCommand:
+      line.error = ParseBeats(parsed, &line.beats);
+      line.action = CommandLine::Action::kBeats;
+      break;
+    case kResampleCommand:
+      line.error = ParseResample(parsed, &line.resample);
+      line.action = CommandLine::Action::kResample;
+      break;
+    case kExampleCommand:
+      line.error = ParseExample(parsed, &line.example, &line.example_path);
+      line.action = CommandLine::Action::kExample;
+      break;
   }
   if (!line.error.empty()) line.action = CommandLine::Action::kUsageError;
   return line;
@@ -292,46 +341,43 @@ std::string OutputName(const std::string& pattern, const std::string& input) {
   return out;
 }
 
-const char* HelpText() {
-  return R"(Usage:
-  clipweaver beats [options] FILE...
-  clipweaver resample IN OUT --rate HZ [--gain L,R]
-  clipweaver example OUT [--bpm BPM] [--seconds S] [--rate HZ] [--channels N]
-  clipweaver --help | --version
-
-beats: prints the tempo and the beat times (in seconds) of each FILE. Any
-format libsndfile reads will do: WAV, FLAC, Ogg Vorbis, AIFF, ...
-  --format F      text (default), csv (file,tempo_bpm,beat,time_s) or json
-                  (one object per file and line)
-  -j, --jobs N    analyse N files at a time (default: one per core); the
-                  results still come in the order of the arguments
-  --click OUT     also write the input mixed with a click on every beat
-  --plot OUT.svg  also draw the waveform, the onset strength and the beats
-                  With several files OUT must hold '{}', which stands for
-                  each input's name without directory and extension.
-  -q, --quiet     no progress bar (it is only drawn when stderr is a terminal)
-  -v, --verbose   let the analysis log through to stderr (no progress bar)
-  Files shorter than 1 second are refused. Ctrl-C stops the analysis,
-  prints what has finished and exits with status 130.
-
-resample: converts IN to another sample rate with the linear resampler,
-block by block; mono stays mono and stereo stays stereo.
-  --rate HZ       output sample rate (required); at most a 3:1 reduction
-  --gain L,R      gains of the left and right channel from -1 to 1
-                  (default 1,1; a mono file takes L)
-
-example: writes the example groove: a kick on every beat, a snare on beats
-2 and 4 and a hi-hat on every off-beat, the same on every machine.
-  --bpm BPM       tempo from 40 to 300 (default 120)
-  --seconds S     length (default 20)
-  --rate HZ       sample rate (default 44100)
-  --channels N    1 or 2 (default 2)
-
+std::string HelpText() {
+  constexpr size_t kHelpColumn = 18;
+  std::string text = "Usage:\n";
+  for (const CommandSpec& command : kCommands) {
+    text += std::string("  clipweaver ") + command.name + " " + command.usage + "\n";
+  }
+  text += "  clipweaver --help | --version\n";
+  const auto indented = [](std::string lines, size_t by) {
+    for (size_t at = lines.find('\n'); at != std::string::npos; at = lines.find('\n', at + by + 1)) {
+      lines.insert(at + 1, by, ' ');
+    }
+    return lines + "\n";
+  };
+  for (const CommandSpec& command : kCommands) {
+    text += std::string("\n") + command.name + ": " + command.about + "\n";
+    for (const OptionSpec& option : kOptions) {
+      if (option.command != command.command) continue;
+      std::string head = "  ";
+      head += option.short_name ? std::string("-") + option.short_name + ", " : "";
+      head += std::string("--") + option.name + (option.value ? std::string(" ") + option.value : "");
+      head.resize(std::max(head.size() + 1, kHelpColumn), ' ');
+      text += head + indented(option.help, kHelpColumn);
+    }
+    if (*command.notes) text += indented(std::string("  ") + command.notes, 2);
+  }
+  return text + R"(
 Written files take their format from the extension: .wav, .flac, .ogg,
-.aiff or .au (16-bit where the format has a bit depth).
+.aiff or .au (16-bit where the format has a bit depth; a WAV past 4 GiB
+becomes RF64, and a length the format cannot hold is refused). Nothing
+appears under an output's name before it is complete: an error or Ctrl-C
+leaves no partial file and existing files untouched. An output that is the
+same file as an input or as another output is refused before any work.
 
-Exit status: 0 success, 1 some file failed, 2 bad command line,
-130 interrupted.
+Ctrl-C stops any command at once; beats prints what has finished first.
+
+Exit status: 0 success, 1 some file failed, 2 bad command line or
+colliding outputs, 130 interrupted.
 
 Examples:
   clipweaver example groove.wav --bpm 100

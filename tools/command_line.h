@@ -39,7 +39,7 @@ CommandLine ParseCommandLine(int argc, const char* const* argv);
 // extension.
 std::string OutputName(const std::string& pattern, const std::string& input);
 
-const char* HelpText();
+std::string HelpText();
 
 }  // namespace cwtool
 

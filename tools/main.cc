@@ -56,7 +56,7 @@ int main(int argc, char** argv) {
   switch (line.action) {
     case CommandLine::Action::kHelp:
       printf("clipweaver %s: beat analysis, resampling and an example track\n\n%s",
-             CLIPWEAVER_VERSION, cwtool::HelpText());
+             CLIPWEAVER_VERSION, cwtool::HelpText().c_str());
       return 0;
     case CommandLine::Action::kVersion:
       printf("clipweaver %s\n", CLIPWEAVER_VERSION);
