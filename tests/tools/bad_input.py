@@ -1,5 +1,7 @@
-"""Unusable input: one clear line per file, the other files still run, and
-the exit status tells."""
+"""Refusals: unusable files and command lines, and outputs that would
+destroy data. Each gives its exit status and one line, changes nothing on
+disk, and leaves the other files of a run their results."""
+import hashlib
 import json
 import os
 import unittest
@@ -8,115 +10,140 @@ import wave
 from tool_harness import example, main, path, run
 
 
-def write_file(name, data):
-    with open(path(name), 'wb') as f:
-        f.write(data)
-    return path(name)
-
-
-def silent_wav(name, frames):
+def silent_wav(name, seconds):
     with wave.open(path(name), 'wb') as w:
         w.setnchannels(1)
         w.setsampwidth(2)
         w.setframerate(44100)
-        w.writeframes(b'\0\0' * frames)
-    return path(name)
+        w.writeframes(b'\0\0' * int(seconds * 44100))
 
 
-class BadInput(unittest.TestCase):
+def snapshot():
+    """Every file under the work directory with its digest."""
+    files = {}
+    for root, _, names in os.walk(path('.')):
+        for name in names:
+            full = os.path.join(root, name)
+            if os.path.isfile(full) and not os.path.islink(full):
+                with open(full, 'rb') as f:
+                    files[full] = hashlib.sha256(f.read()).hexdigest()
+    return files
+
+
+class Refusals(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
-        os.makedirs(path('folder.wav'), exist_ok=True)
-        cls.cases = [
-            (path('missing.wav'), 'no such file'),
-            (write_file('notes.wav', b'just some text\n' * 20),
-             'unsupported format (not a sound file libsndfile can decode)'),
-            (write_file('empty.flac', b''), 'no audio (the file is empty)'),
-            (silent_wav('no-frames.wav', 0),
-             'no audio (the file holds no samples)'),
-            (example('blip.wav', seconds=0.5),
-             'too short to analyse (0.50 s; at least 1.00 s needed)'),
-            (path('folder.wav'), 'is a directory, not a sound file'),
-        ]
-        cls.good = example('good.wav')
+        example('a.wav', seconds=3)
+        example('b.wav', 100, seconds=3)
+        example('blip.wav', seconds=0.5)
+        os.link(path('a.wav'), path('a-hard.wav'))
+        os.symlink('a.wav', path('a-link.wav'))
+        os.makedirs(path('sub/folder.wav'))
+        os.mkfifo(path('pipe.wav'))
+        with open(path('notes.wav'), 'wb') as f:
+            f.write(b'just some text\n' * 20)
+        open(path('empty.flac'), 'wb').close()
+        silent_wav('no-frames.wav', 0)
 
-    def test_each_case_names_the_file_and_the_reason(self):
-        for bad, reason in self.cases:
-            with self.subTest(os.path.basename(bad)):
-                done = run('beats', bad)
-                self.assertEqual(done.returncode, 1)
-                self.assertEqual(done.stderr, f'clipweaver: {bad}: {reason}\n')
-                self.assertEqual(done.stdout, '')
+    # (arguments, exit status, the line after 'clipweaver: ')
+    USAGE = ' (see clipweaver --help)'
+    SAME = 'is the same file as'
+    FORMATS = 'unknown output format (use .wav, .flac, .ogg, .aiff or .au)'
+    CASES = [
+        ((), 2, 'no command given' + USAGE),
+        (('analyse', 'a.wav'), 2, "unknown command 'analyse'" + USAGE),
+        (('beats',), 2, 'beats needs at least one FILE' + USAGE),
+        (('beats', '--format', 'xml', 'a.wav'), 2,
+         "--format 'xml' is not one of text, csv, json" + USAGE),
+        (('beats', '-j', '0', 'a.wav'), 2, "--jobs '0' is not a number from 1 to 1024" + USAGE),
+        (('beats', 'a.wav', '-j'), 2, '-j needs a value' + USAGE),
+        (('beats', '--colour', 'a.wav'), 2, "unknown option '--colour'" + USAGE),
+        (('beats', '--quiet=yes', 'a.wav'), 2, '--quiet takes no value' + USAGE),
+        (('beats', 'a.wav', 'b.wav', '--click', 'out.wav'), 2,
+         "--click with several files needs '{}' in its name, e.g. '{}.click.wav'" + USAGE),
+        (('beats', 'a.wav', 'sub/a.wav', '--plot', '{}.svg'), 2,
+         "--plot '{}.svg' gives the same name 'a.svg' to two inputs" + USAGE),
+        (('beats', 'a.wav', '--click', 'a.mp3'), 2, f"--click 'a.mp3': {FORMATS}" + USAGE),
+        (('beats', 'a.wav', '--plot', 'a.png'), 2, "--plot 'a.png' does not end in .svg" + USAGE),
+        (('resample', 'a.wav', 'out.wav'), 2, 'resample needs --rate HZ' + USAGE),
+        (('resample', 'a.wav', 'out.wav', '--rate', '48k'), 2,
+         "--rate '48k' is not a sample rate in Hz (1000 to 768000)" + USAGE),
+        (('resample', 'a.wav', 'out.wav', '--rate', '48000', '--gain', '2,1'), 2,
+         "--gain '2,1' is not L,R with both gains from -1 to 1" + USAGE),
+        (('resample', 'a.wav', 'out.mp4', '--rate', '48000'), 2, f'out.mp4: {FORMATS}' + USAGE),
+        (('example', 'x.wav', '--channels', '3'), 2, "--channels '3' is not 1 or 2" + USAGE),
+        (('example', 'x.wav', '--seconds', '0'), 2,
+         "--seconds '0' is not a duration from 0 to 3600" + USAGE),
+        # Outputs onto inputs, however they are named.
+        (('resample', 'a.wav', 'a.wav', '--rate', 48000), 2,
+         f"output 'a.wav' {SAME} input 'a.wav'; nothing written"),
+        (('resample', 'a.wav', 'a-hard.wav', '--rate', 48000), 2,
+         f"output 'a-hard.wav' {SAME} input 'a.wav'; nothing written"),
+        (('resample', 'a.wav', 'sub/../a-link.wav', '--rate', 48000), 2,
+         f"output 'sub/../a-link.wav' {SAME} input 'a.wav'; nothing written"),
+        (('beats', 'a.wav', 'b.wav', '--click', '{}.wav'), 2,
+         f"--click output 'a.wav' {SAME} input 'a.wav'; nothing written"),
+        (('beats', 'a.wav', 'b.wav', '--click', 'sub/../{}.wav'), 2,
+         f"--click output 'sub/../a.wav' {SAME} input 'a.wav'; nothing written"),
+        # Outputs the format or the target cannot take. 11 GB of samples is
+        # past what AIFF's 32-bit sizes hold.
+        (('example', 'big.aiff', '--seconds', 3600, '--rate', 768000), 1,
+         'big.aiff: cannot write: too long for .aiff (it holds at most '
+         '1398.10 s at this rate and channel count); use .wav, .flac or .ogg'),
+        (('resample', 'a.wav', 'no/dir/out.wav', '--rate', 48000), 1,
+         'no/dir/out.wav: cannot write: no such directory'),
+        (('resample', 'a.wav', 'pipe.wav', '--rate', 48000), 1,
+         'pipe.wav: cannot write: exists and is not a regular file'),
+        # Unusable inputs.
+        (('beats', 'missing.wav'), 1, 'missing.wav: no such file'),
+        (('beats', 'notes.wav'), 1,
+         'notes.wav: unsupported format (not a sound file libsndfile can decode)'),
+        (('beats', 'empty.flac'), 1, 'empty.flac: no audio (the file is empty)'),
+        (('beats', 'no-frames.wav'), 1, 'no-frames.wav: no audio (the file holds no samples)'),
+        (('beats', 'blip.wav'), 1,
+         'blip.wav: too short to analyse (0.50 s; at least 1.00 s needed)'),
+        (('beats', 'sub/folder.wav'), 1, 'sub/folder.wav: is a directory, not a sound file'),
+        (('beats', 'pipe.wav'), 1,
+         'pipe.wav: is a named pipe, not a regular file (sound files are read with seeks)'),
+        (('resample', 'a.wav', 'low.wav', '--rate', 8000), 1,
+         'a.wav: 44100 Hz to 8000 Hz is more than the 3:1 reduction the resampler allows'),
+    ]
 
-    def test_good_files_among_bad_ones_still_get_their_beats(self):
-        files = [bad for bad, _ in self.cases]
-        files.insert(3, self.good)
-        done = run('beats', '-j3', *files)
-        self.assertEqual(done.returncode, 1)
-        self.assertTrue(done.stdout.startswith(self.good + ': 120.00 BPM'))
-        self.assertEqual(done.stderr.splitlines(),
-                         [f'clipweaver: {bad}: {reason}'
-                          for bad, reason in self.cases])
-
-    def test_json_has_an_error_object_in_place_of_each_bad_file(self):
-        missing, reason = self.cases[0]
-        done = run('beats', '--format', 'json', missing, self.good)
-        self.assertEqual(done.returncode, 1)
-        first, second = map(json.loads, done.stdout.splitlines())
-        self.assertEqual(first, {'file': missing, 'error': reason})
-        self.assertEqual(second['tempo'], 120.0)
+    def test_each_refusal_is_one_line_and_changes_nothing(self):
+        before = snapshot()
+        for args, status, message in self.CASES:
+            with self.subTest(args):
+                done = run(*args, timeout=20)
+                self.assertEqual((done.returncode, done.stderr, done.stdout),
+                                 (status, f'clipweaver: {message}\n', ''))
+                self.assertEqual(snapshot(), before)
 
     @unittest.skipIf(os.geteuid() == 0, 'root reads any file')
     def test_unreadable_file(self):
-        locked = example('locked.wav')
-        os.chmod(locked, 0)
+        os.chmod(path('b.wav'), 0)
         try:
-            done = run('beats', locked)
+            done = run('beats', 'b.wav')
         finally:
-            os.chmod(locked, 0o644)
+            os.chmod(path('b.wav'), 0o644)
+        self.assertEqual(done.stderr, 'clipweaver: b.wav: unreadable: permission denied\n')
+
+    def test_good_files_among_bad_ones_still_get_their_beats(self):
+        bad = [args[1] for args, status, _ in self.CASES
+               if status == 1 and args[0] == 'beats']
+        done = run('beats', '-j3', '--format', 'json', *bad[:3], 'a.wav', *bad[3:])
         self.assertEqual(done.returncode, 1)
-        self.assertEqual(done.stderr,
-                         f'clipweaver: {locked}: unreadable: permission denied\n')
+        results = [json.loads(line) for line in done.stdout.splitlines()]
+        self.assertEqual([r['file'] for r in results], bad[:3] + ['a.wav'] + bad[3:])
+        self.assertEqual(results[3]['tempo'], 120.0)
+        self.assertEqual(results[0], {'file': 'missing.wav', 'error': 'no such file'})
+        self.assertEqual(len(done.stderr.splitlines()), len(bad))
 
     def test_silence_is_analysed_but_has_no_tempo(self):
-        quiet = silent_wav('silence.wav', 3 * 44100)
-        done = run('beats', '--format', 'json', quiet)
+        silent_wav('silence.wav', 3)
+        done = run('beats', '--format', 'json', 'silence.wav')
         self.assertEqual(done.returncode, 0, done.stderr)
         result = json.loads(done.stdout)
-        self.assertIsNone(result['tempo'])
-        self.assertEqual(result['beats'], [])
-
-
-class BadCommandLine(unittest.TestCase):
-    def test_usage_errors_exit_with_2_and_say_what_is_wrong(self):
-        good = example('good.wav')
-        cases = [
-            ((), 'no command given'),
-            (('analyse', good), "unknown command 'analyse'"),
-            (('beats',), 'beats needs at least one FILE'),
-            (('beats', '--format', 'xml', good),
-             "--format 'xml' is not one of text, csv, json"),
-            (('beats', '-j', '0', good), "--jobs '0' is not a number from 1 to 1024"),
-            (('beats', '--colour', good), "unknown option '--colour'"),
-            (('beats', good, good, '--click', 'out.wav'),
-             "--click with several files needs '{}' in its name, e.g. '{}.click.wav'"),
-            (('beats', good, 'x/good.flac', '--plot', '{}.svg'),
-             "--plot '{}.svg' gives the same name 'good.svg' to two inputs"),
-            (('resample', good, 'out.wav'), 'resample needs --rate HZ'),
-            (('resample', good, 'out.wav', '--rate', '48k'),
-             "--rate '48k' is not a sample rate in Hz (1000 to 768000)"),
-            (('resample', good, 'out.wav', '--rate', '48000', '--gain', '2,1'),
-             "--gain '2,1' is not L,R with both gains from -1 to 1"),
-            (('example', 'x.wav', '--channels', '3'), "--channels '3' is not 1 or 2"),
-            (('example', 'x.wav', '--seconds', '0'),
-             "--seconds '0' is not a duration from 0 to 3600"),
-        ]
-        for args, message in cases:
-            with self.subTest(args):
-                done = run(*args)
-                self.assertEqual(done.returncode, 2)
-                self.assertEqual(done.stderr,
-                                 f'clipweaver: {message} (see clipweaver --help)\n')
+        self.assertEqual((result['tempo'], result['beats']), (None, []))
 
 
 if __name__ == '__main__':

@@ -1,5 +1,6 @@
-"""Nothing lost: refused collisions, formats' size limits, bounded memory,
-pipes that cannot block, and Ctrl-C that leaves every file as it was."""
+"""Nothing lost (the refusals are in bad_input): Ctrl-C in every phase
+leaves every file as it was, memory stays bounded whatever the ratio, and
+what a file's header hides or its name holds is told plainly."""
 import hashlib
 import os
 import signal
@@ -35,11 +36,7 @@ class DataSafety(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
         cls.a = example('a.wav', seconds=3)
-        cls.b = example('b.wav', 100, seconds=3)
-        os.link(cls.a, path('a-hard.wav'))
-        os.symlink('a.wav', path('a-link.wav'))
         os.makedirs(path('sub'))
-        os.mkfifo(path('pipe.wav'))
         with open(path('kept.wav'), 'wb') as f:
             f.write(b'an older file')
         # 5 frames at 1 Hz: upsampled to 768 kHz, 3.84 million frames.
@@ -49,52 +46,6 @@ class DataSafety(unittest.TestCase):
             w.setframerate(1)
             w.writeframes(b'\x10\x00\x20\x00' * 5)
         cls.slow = example('slow.wav', 120, 8000, 1, seconds=1200)
-
-    def test_refusals_before_any_work_leave_every_file_as_it_was(self):
-        same = 'is the same file as'
-        cases = [
-            (('resample', 'a.wav', 'a.wav', '--rate', 48000), 2,
-             f"output 'a.wav' {same} input 'a.wav'; nothing written"),
-            (('resample', 'a.wav', 'a-hard.wav', '--rate', 48000), 2,
-             f"output 'a-hard.wav' {same} input 'a.wav'; nothing written"),
-            (('resample', 'a.wav', 'sub/../a-link.wav', '--rate', 48000), 2,
-             f"output 'sub/../a-link.wav' {same} input 'a.wav'; nothing written"),
-            (('beats', 'a.wav', 'b.wav', '--click', '{}.wav'), 2,
-             f"--click output 'a.wav' {same} input 'a.wav'; nothing written"),
-            (('beats', 'a.wav', 'b.wav', '--click', 'sub/../{}.wav'), 2,
-             f"--click output 'sub/../a.wav' {same} input 'a.wav'; nothing written"),
-            (('beats', 'a.wav', 'sub/a.wav', '--plot', '{}.svg'), 2,
-             "--plot '{}.svg' gives the same name 'a.svg' to two inputs "
-             '(see clipweaver --help)'),
-            (('beats', 'a.wav', '--click', 'a.mp3'), 2,
-             "--click 'a.mp3': unknown output format "
-             '(use .wav, .flac, .ogg, .aiff or .au) (see clipweaver --help)'),
-            (('beats', 'a.wav', '--plot', 'a.png'), 2,
-             "--plot 'a.png' does not end in .svg (see clipweaver --help)"),
-            (('example', 'kept.wav.mp3'), 2,
-             'kept.wav.mp3: unknown output format '
-             '(use .wav, .flac, .ogg, .aiff or .au) (see clipweaver --help)'),
-            # 11 GB of samples: past what AIFF's 32-bit sizes hold.
-            (('example', 'kept.aiff', '--seconds', 3600, '--rate', 768000), 1,
-             'kept.aiff: cannot write: too long for .aiff (it holds at most '
-             '1398.10 s at this rate and channel count); use .wav, .flac or .ogg'),
-            (('beats', 'pipe.wav'), 1,
-             'pipe.wav: is a named pipe, not a regular file '
-             '(sound files are read with seeks)'),
-            (('resample', 'a.wav', 'no/dir/out.wav', '--rate', 48000), 1,
-             'no/dir/out.wav: cannot write: no such directory'),
-            (('resample', 'a.wav', 'pipe.wav', '--rate', 48000), 1,
-             'pipe.wav: cannot write: exists and is not a regular file'),
-        ]
-        before = {name: digest(name) for name in ('a.wav', 'b.wav', 'kept.wav')}
-        files = listing()
-        for args, status, message in cases:
-            with self.subTest(args):
-                done = run(*args, timeout=20)
-                self.assertEqual((done.returncode, done.stderr),
-                                 (status, f'clipweaver: {message}\n'))
-                self.assertEqual(listing(), files)
-        self.assertEqual({name: digest(name) for name in before}, before)
 
     def test_one_hertz_to_768_khz_runs_in_bounded_memory(self):
         done = run('resample', 'one-hertz.wav', 'up.wav', '--rate', 768000,

@@ -1,5 +1,4 @@
-"""What a person at a terminal sees: help, version, the progress bar and
-Ctrl-C."""
+"""What a person at a terminal sees: help, version and the progress bar."""
 import os
 import pty
 import re

@@ -29,39 +29,26 @@ class Resample(unittest.TestCase):
                 self.assertEqual(len(samples) // channels,
                                  rate * source_frames // source_rate)
 
-    def test_equal_rates_delay_the_stream_by_one_frame(self):
-        _, _, music = read_wav(self.stereo)
-        _, _, out = resample(self.stereo, 'same.wav', '--rate', 44100)
-        self.assertEqual(out[:2], [0, 0])
-        self.assertEqual(out[2:], music[:-2])
-
-    def test_gains_truncate_toward_zero_per_channel(self):
+    def test_blocks_join_without_a_seam(self):
+        # Equal rates pass every frame through, one frame late, with each
+        # channel's gain truncated toward zero; a third of the rate keeps
+        # every third frame.
         _, _, music = read_wav(self.stereo)
         _, _, out = resample(self.stereo, 'gain.wav', '--rate', 44100,
                              '--gain', '0.5,-0.25')
+        self.assertEqual(out[:2], [0, 0])
         self.assertEqual(out[2::2], [int(v * 0.5) for v in music[0:-2:2]])
         self.assertEqual(out[3::2], [int(v * -0.25) for v in music[1:-2:2]])
-
-    def test_a_third_of_the_rate_keeps_every_third_frame(self):
         _, _, music = read_wav(self.mono)
         _, _, out = resample(self.mono, 'third.wav', '--rate', 16000)
-        self.assertEqual(out[0], 0)
-        self.assertEqual(out[1:], music[2::3][:len(out) - 1])
+        self.assertEqual(out, [0] + music[2::3][:len(out) - 1])
 
     def test_resampled_groove_keeps_its_tempo(self):
         long = example('long.wav', 120, 44100, 2)
-        run('resample', long, 'at32k.wav', '--rate', 32000)
-        [result] = beats_json(path('at32k.wav'))
+        self.assertEqual(run('resample', long, 'at32k.flac', '--rate', 32000).returncode, 0)
+        [result] = beats_json(path('at32k.flac'))
         self.assertEqual(result['sample_rate'], 32000)
         self.assertLess(abs(result['tempo'] - 120) / 120, 0.01)
-
-    def test_refusals(self):
-        done = run('resample', self.mono, 'low.wav', '--rate', 8000)
-        self.assertEqual(done.returncode, 1)
-        self.assertEqual(done.stderr, f'clipweaver: {self.mono}: 48000 Hz to 8000 Hz '
-                         'is more than the 3:1 reduction the resampler allows\n')
-        done = run('resample', 'absent.wav', 'x.wav', '--rate', 8000)
-        self.assertEqual(done.stderr, 'clipweaver: absent.wav: no such file\n')
 
 
 if __name__ == '__main__':
