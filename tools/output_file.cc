@@ -12,8 +12,8 @@
 namespace cwtool {
 namespace {
 
-// mkstemp makes files 0600; a finished output gets the mode a plain
-// creation would give it. Read once, before any worker creates files.
+// mkstemp makes files 0600; a new output gets the mode a plain creation
+// would give it. Read once, before any worker creates files.
 mode_t CreationMode() {
   static const mode_t mode = [] {
     const mode_t mask = umask(0);
@@ -26,8 +26,9 @@ mode_t CreationMode() {
 // Writing through a symbolic link replaces what it points to, as a plain
 // open would, rather than the link itself.
 bool ResolveTarget(const std::string& path, std::string* target,
-                   std::string* error) {
+                   mode_t* mode, std::string* error) {
   *target = path;
+  *mode = CreationMode();
   struct stat status;
   if (lstat(path.c_str(), &status) != 0) return true;
   if (S_ISLNK(status.st_mode)) {
@@ -44,6 +45,8 @@ bool ResolveTarget(const std::string& path, std::string* target,
     *error = "cannot write: exists and is not a regular file";
     return false;
   }
+  // A file written over keeps its permissions, as it would with O_TRUNC.
+  *mode = status.st_mode & 07777;
   return true;
 }
 
@@ -75,7 +78,8 @@ std::string WriteErrorText(int errno_value) {
 OutputFile::~OutputFile() { Discard(); }
 
 bool OutputFile::Create(const std::string& path, std::string* error) {
-  if (!ResolveTarget(path, &target_, error)) return false;
+  mode_t mode;
+  if (!ResolveTarget(path, &target_, &mode, error)) return false;
   const size_t slash = target_.find_last_of('/');
   const std::string directory = slash == std::string::npos ? "" : target_.substr(0, slash + 1);
   const std::string name = target_.substr(slash == std::string::npos ? 0 : slash + 1);
@@ -90,7 +94,7 @@ bool OutputFile::Create(const std::string& path, std::string* error) {
     return false;
   }
   temporary_ = pattern;
-  fchmod(fd_, CreationMode());
+  fchmod(fd_, mode);
   return true;
 }
 

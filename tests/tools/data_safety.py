@@ -73,6 +73,9 @@ class DataSafety(unittest.TestCase):
             (('resample', 'slow.wav', 'kept.wav', '--rate', 768000),
              partial('kept.wav', b'RIFF'),
              'resampling of slow.wav stopped; nothing written', []),
+            (('beats', '-q', 'slow.wav', '--click', 'clicks.wav'),
+             partial('clicks.wav', b'RIFF'), 'analysis of slow.wav stopped; '
+             '0 of 1 files done, no output left from the others', []),
             (('beats', '-q', '-j1', 'a.wav', 'slow.wav', '--plot', 'sub/{}.svg'),
              first_result, 'analysis of slow.wav stopped; '
              '1 of 2 files done, no output left from the others', ['a.svg']),
