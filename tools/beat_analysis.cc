@@ -89,7 +89,9 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   plotted.channels = result.channels;
   std::vector<int16_t> block(static_cast<size_t>(kBlockFrames) * result.channels);
   int64_t frames = 0;
-  for (int64_t got; (got = reader.Read(block.data(), kBlockFrames)) > 0;) {
+  // The analyzer polls for Ctrl-C only where it reports progress, which
+  // it cannot while the length is unknown.
+  for (int64_t got; !Interrupted() && (got = reader.Read(block.data(), kBlockFrames)) > 0;) {
     frames += got;
     if (!analyzer.Feed(block.data(), static_cast<int32_t>(got))) break;
     if (!extras.plot_path.empty()) {
