@@ -6,9 +6,12 @@
 
 #include "jni/apm/audio_analyzer.h"
 #include "tools/audio_file.h"
+#include "tools/beat_view.h"
 #include "tools/click_track.h"
+#include "tools/html_page.h"
 #include "tools/interrupt.h"
 #include "tools/svg_plot.h"
+#include "tools/text_file.h"
 
 namespace cwtool {
 namespace {
@@ -47,16 +50,17 @@ std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& audio,
       !WriteClickTrack(extras.click_path, audio, result.beats, &error)) {
     return extras.click_path + ": " + error;
   }
-  if (!extras.plot_path.empty()) {
-    const BeatPlot plot{result.path,
-                        &audio,
-                        &analyzer.detection_function(),
-                        analyzer.frames_per_second(),
-                        &result.beats,
-                        result.bpm};
-    if (!WriteBeatPlot(extras.plot_path, plot, &error)) {
-      return extras.plot_path + ": " + error;
-    }
+  if (extras.plot_path.empty() && extras.html_path.empty()) return std::string();
+  BeatView view = MakeBeatView(result, audio, analyzer.detection_function(),
+                               analyzer.frames_per_second());
+  if (!extras.plot_path.empty() &&
+      !WriteTextFile(extras.plot_path, BeatPlotSvg(view), &error)) {
+    return extras.plot_path + ": " + error;
+  }
+  if (!extras.html_path.empty() &&
+      (!AddCompactAudio(audio, &view, &error) ||
+       !WriteTextFile(extras.html_path, BeatPageHtml(view), &error))) {
+    return extras.html_path + ": " + error;
   }
   return std::string();
 }

@@ -29,6 +29,9 @@ ExtraOutputs ExtrasFor(const BeatsOptions& options, const std::string& file) {
   if (!options.plot_pattern.empty()) {
     extras.plot_path = OutputName(options.plot_pattern, file);
   }
+  if (!options.html_pattern.empty()) {
+    extras.html_path = OutputName(options.html_pattern, file);
+  }
   return extras;
 }
 

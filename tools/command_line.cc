@@ -6,6 +6,7 @@
 #include <cstdlib>
 #include <map>
 #include <set>
+#include <utility>
 
 namespace cwtool {
 namespace {
@@ -19,7 +20,7 @@ struct OptionSpec {
 const std::vector<OptionSpec> kBeatsOptions = {
     {"format", 0, true}, {"jobs", 'j', true},  {"quiet", 'q', false},
     {"verbose", 'v', false}, {"click", 0, true}, {"plot", 0, true},
-    {"help", 'h', false}};
+    {"html", 0, true}, {"help", 'h', false}};
 const std::vector<OptionSpec> kResampleOptions = {
     {"rate", 0, true}, {"gain", 0, true}, {"help", 'h', false}};
 const std::vector<OptionSpec> kExampleOptions = {
@@ -153,18 +154,20 @@ std::string ParseBeats(const Arguments& a, BeatsOptions* out) {
   if (a.values.count("jobs") && !ParseInt(a.values.at("jobs"), 1, 1024, &out->jobs)) {
     return "--jobs '" + a.values.at("jobs") + "' is not a number from 1 to 1024";
   }
-  for (const char* option : {"click", "plot"}) {
+  const std::pair<const char*, std::string*> outputs[] = {
+      {"click", &out->click_pattern}, {"plot", &out->plot_pattern}, {"html", &out->html_pattern}};
+  for (const auto& [option, target] : outputs) {
     if (!a.values.count(option)) continue;
     const std::string& pattern = a.values.at(option);
-    std::string& target = std::string(option) == "click" ? out->click_pattern
-                                                          : out->plot_pattern;
-    target = pattern;
+    *target = pattern;
     if (pattern.empty()) return std::string("--") + option + " needs a file name";
     if (out->files.size() == 1) continue;
     if (pattern.find("{}") == std::string::npos) {
+      const std::string example = std::string(option) == "click" ? "click.wav"
+                                  : std::string(option) == "plot" ? "svg"
+                                                                  : "html";
       return std::string("--") + option +
-             " with several files needs '{}' in its name, e.g. '{}." +
-             (std::string(option) == "click" ? "click.wav" : "svg") + "'";
+             " with several files needs '{}' in its name, e.g. '{}." + example + "'";
     }
     std::set<std::string> names;
     for (const std::string& file : out->files) {
@@ -295,7 +298,10 @@ format libsndfile reads will do: WAV, FLAC, Ogg Vorbis, AIFF, ...
   -j, --jobs N    analyse N files at a time (default: one per core); the
                   results still come in the order of the arguments
   --click OUT     also write the input mixed with a click on every beat
-  --plot OUT.svg  also draw the waveform, the onset strength and the beats
+  --plot OUT.svg  also draw the waveform, the onset strength and the beats,
+                  the whole track on top, then in rows of 10 seconds
+  --html OUT.html also write a page that shows and plays the track with its
+                  beats (zoom, seek, a click on every beat), usable offline
                   With several files OUT must hold '{}', which stands for
                   each input's name without directory and extension.
   -q, --quiet     no progress bar (it is only drawn when stderr is a terminal)

@@ -102,6 +102,8 @@ class BadCommandLine(unittest.TestCase):
              "--click with several files needs '{}' in its name, e.g. '{}.click.wav'"),
             (('beats', good, 'x/good.flac', '--plot', '{}.svg'),
              "--plot '{}.svg' gives the same name 'good.svg' to two inputs"),
+            (('beats', good, good, '--html', 'page.html'),
+             "--html with several files needs '{}' in its name, e.g. '{}.html'"),
             (('resample', good, 'out.wav'), 'resample needs --rate HZ'),
             (('resample', good, 'out.wav', '--rate', '48k'),
              "--rate '48k' is not a sample rate in Hz (1000 to 768000)"),
