@@ -12,20 +12,6 @@
 
 namespace cwtool {
 
-// A whole file in memory.
-struct DecodedAudio {
-  int32_t sample_rate = 0;
-  int32_t channels = 0;
-  std::vector<int16_t> samples;  // interleaved
-
-  int64_t frames() const {
-    return channels > 0 ? static_cast<int64_t>(samples.size()) / channels : 0;
-  }
-  double seconds() const {
-    return sample_rate > 0 ? static_cast<double>(frames()) / sample_rate : 0.0;
-  }
-};
-
 class AudioReader {
  public:
   AudioReader() = default;

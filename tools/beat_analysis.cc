@@ -2,13 +2,16 @@
 
 #include <cmath>
 #include <cstdio>
+#include <memory>
 
 #include "jni/apm/audio_analyzer.h"
 #include "tools/audio_file.h"
+#include "tools/beat_view.h"
 #include "tools/click_track.h"
+#include "tools/html_page.h"
 #include "tools/interrupt.h"
-#include "tools/output_file.h"
 #include "tools/svg_plot.h"
+#include "tools/text_file.h"
 
 namespace cwtool {
 namespace {
@@ -30,7 +33,7 @@ std::string TooShort(double seconds) {
          Seconds(kMinimumSeconds) + " needed)";
 }
 
-std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& plotted,
+std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
                         const apm::AudioAnalyzer& analyzer,
                         const BeatResult& result) {
   std::string error;
@@ -38,16 +41,19 @@ std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& plotted,
       !WriteClickTrack(extras.click_path, result.path, result.beats, &error)) {
     return Interrupted() ? std::string() : extras.click_path + ": " + error;
   }
-  if (!extras.plot_path.empty()) {
-    const BeatPlot plot{result.path,
-                        &plotted,
-                        &analyzer.detection_function(),
-                        analyzer.frames_per_second(),
-                        &result.beats,
-                        result.bpm};
-    if (!WriteTextFile(extras.plot_path, BeatPlotSvg(plot), &error)) {
-      return extras.plot_path + ": " + error;
-    }
+  if (signal == nullptr) return std::string();
+  BeatView view;
+  if (!signal->MakeView(result, analyzer.detection_function(),
+                        analyzer.frames_per_second(), &view, &error)) {
+    return extras.html_path + ": " + error;
+  }
+  if (!extras.plot_path.empty() &&
+      !WriteTextFile(extras.plot_path, BeatPlotSvg(view), &error)) {
+    return extras.plot_path + ": " + error;
+  }
+  if (!extras.html_path.empty() &&
+      !WriteTextFile(extras.html_path, BeatPageHtml(view), &error)) {
+    return extras.html_path + ": " + error;
   }
   return std::string();
 }
@@ -83,10 +89,11 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     result.error = "the analysis failed (see --verbose for its log)";
     return result;
   }
-  // The plot draws its waveform from the whole signal.
-  DecodedAudio plotted;
-  plotted.sample_rate = result.sample_rate;
-  plotted.channels = result.channels;
+  std::unique_ptr<BeatViewSignal> signal;
+  if (!extras.plot_path.empty() || !extras.html_path.empty()) {
+    signal = std::make_unique<BeatViewSignal>(result.sample_rate, result.channels,
+                                              !extras.html_path.empty());
+  }
   std::vector<int16_t> block(static_cast<size_t>(kBlockFrames) * result.channels);
   int64_t frames = 0;
   // The analyzer polls for Ctrl-C only where it reports progress, which
@@ -94,10 +101,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   for (int64_t got; !Interrupted() && (got = reader.Read(block.data(), kBlockFrames)) > 0;) {
     frames += got;
     if (!analyzer.Feed(block.data(), static_cast<int32_t>(got))) break;
-    if (!extras.plot_path.empty()) {
-      plotted.samples.insert(plotted.samples.end(), block.begin(),
-                             block.begin() + got * result.channels);
-    }
+    if (signal) signal->Add(block.data(), got);
     if (!length_known) progress(static_cast<int>(kSpectrogramPercent * reader.fraction_read()));
   }
   if (Interrupted()) {
@@ -128,7 +132,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   if (count >= 2 && std::isfinite(analyzer.bpm()) && analyzer.bpm() > 0) {
     result.bpm = analyzer.bpm();
   }
-  result.output_error = WriteExtras(extras, plotted, analyzer, result);
+  result.output_error = WriteExtras(extras, signal.get(), analyzer, result);
   if (Interrupted()) {
     result.interrupted = true;
     return result;

@@ -1,6 +1,6 @@
 // One file through the beat analysis: decoding, the checks that give clear
 // reasons for unusable input, the analysis itself and the optional click
-// track and plot.
+// track, plot and page.
 #ifndef CLIPWEAVER_TOOLS_BEAT_ANALYSIS_H_
 #define CLIPWEAVER_TOOLS_BEAT_ANALYSIS_H_
 
@@ -24,13 +24,14 @@ struct BeatResult {
   double duration = 0;  // seconds
   double bpm = 0;       // 0: unknown (fewer than two beats)
   std::vector<float> beats;
-  // A click track or plot that could not be written; the result stands.
+  // A click track, plot or page that could not be written; the result stands.
   std::string output_error;
 };
 
 struct ExtraOutputs {
   std::string click_path;  // empty: none
   std::string plot_path;
+  std::string html_path;
 };
 
 // progress gets 0..100 percent. Stops early, with `interrupted` set and no

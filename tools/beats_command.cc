@@ -32,6 +32,9 @@ ExtraOutputs ExtrasFor(const BeatsOptions& options, const std::string& file) {
   if (!options.plot_pattern.empty()) {
     extras.plot_path = OutputName(options.plot_pattern, file);
   }
+  if (!options.html_pattern.empty()) {
+    extras.html_path = OutputName(options.html_pattern, file);
+  }
   return extras;
 }
 
@@ -41,6 +44,7 @@ std::string CheckOutputs(const BeatsOptions& options) {
     const ExtraOutputs extras = ExtrasFor(options, file);
     if (!extras.click_path.empty()) outputs.push_back({extras.click_path, "--click output"});
     if (!extras.plot_path.empty()) outputs.push_back({extras.plot_path, "--plot output"});
+    if (!extras.html_path.empty()) outputs.push_back({extras.html_path, "--html output"});
   }
   return FindCollision(options.files, outputs);
 }

@@ -35,7 +35,11 @@ constexpr OptionSpec kOptions[] = {
     {kBeatsCommand, "click", 0, "OUT",
      "also write the input mixed with a click on every beat"},
     {kBeatsCommand, "plot", 0, "OUT.svg",
-     "also draw the waveform, the onset strength and the beats\n"
+     "also draw the waveform, the onset strength and the beats,\n"
+     "the whole track on top, then in rows of 10 seconds"},
+    {kBeatsCommand, "html", 0, "OUT.html",
+     "also write a page that shows and plays the track with its\n"
+     "beats (zoom, seek, a click on every beat), usable offline\n"
      "With several files OUT must hold '{}', which stands for\n"
      "each input's name without directory and extension."},
     {kBeatsCommand, "quiet", 'q', nullptr,
@@ -202,30 +206,41 @@ std::string ParseBeats(const Arguments& a, BeatsOptions* out) {
   if (a.values.count("jobs") && !ParseInt(a.values.at("jobs"), 1, 1024, &out->jobs)) {
     return "--jobs '" + a.values.at("jobs") + "' is not a number from 1 to 1024";
   }
-  for (const char* option : {"click", "plot"}) {
+  // Each output option: its pattern, the ending it needs (empty: an audio
+  // format's) and the example its help gives for several files.
+  struct OutputOption {
+    const char* name;
+    std::string* pattern;
+    const char* ending;
+    const char* example;
+  };
+  const OutputOption outputs[] = {{"click", &out->click_pattern, "", "click.wav"},
+                                  {"plot", &out->plot_pattern, ".svg", "svg"},
+                                  {"html", &out->html_pattern, ".html", "html"}};
+  for (const OutputOption& output : outputs) {
+    const std::string option = output.name;
     if (!a.values.count(option)) continue;
     const std::string& pattern = a.values.at(option);
-    std::string& target = std::string(option) == "click" ? out->click_pattern
-                                                          : out->plot_pattern;
-    target = pattern;
-    if (pattern.empty()) return std::string("--") + option + " needs a file name";
-    if (std::string(option) == "click" && OutputFormatFor(pattern) == 0) {
-      return "--click '" + pattern + "': " + kUnknownOutputFormat;
+    *output.pattern = pattern;
+    if (pattern.empty()) return "--" + option + " needs a file name";
+    const std::string ending = output.ending;
+    if (ending.empty() && OutputFormatFor(pattern) == 0) {
+      return "--" + option + " '" + pattern + "': " + kUnknownOutputFormat;
     }
-    if (std::string(option) == "plot" &&
-        (pattern.size() < 4 || pattern.compare(pattern.size() - 4, 4, ".svg") != 0)) {
-      return "--plot '" + pattern + "' does not end in .svg";
+    if (!ending.empty() && (pattern.size() < ending.size() ||
+                            pattern.compare(pattern.size() - ending.size(),
+                                            ending.size(), ending) != 0)) {
+      return "--" + option + " '" + pattern + "' does not end in " + ending;
     }
     if (out->files.size() == 1) continue;
     if (pattern.find("{}") == std::string::npos) {
-      return std::string("--") + option +
-             " with several files needs '{}' in its name, e.g. '{}." +
-             (std::string(option) == "click" ? "click.wav" : "svg") + "'";
+      return "--" + option + " with several files needs '{}' in its name, e.g. '{}." +
+             output.example + "'";
     }
     std::set<std::string> names;
     for (const std::string& file : out->files) {
       if (!names.insert(OutputName(pattern, file)).second) {
-        return std::string("--") + option + " '" + pattern +
+        return "--" + option + " '" + pattern +
                "' gives the same name '" + OutputName(pattern, file) +
                "' to two inputs";
       }

@@ -21,6 +21,7 @@ struct BeatsOptions {
   // without directory and extension.
   std::string click_pattern;
   std::string plot_pattern;
+  std::string html_pattern;
 };
 
 struct CommandLine {

@@ -28,10 +28,6 @@ class OutputFile {
   int fd_ = -1;
 };
 
-// The whole text through an OutputFile.
-bool WriteTextFile(const std::string& path, const std::string& text,
-                   std::string* error);
-
 // "cannot write: " and the reason, in our words.
 std::string WriteErrorText(int errno_value);
 

@@ -1,9 +1,9 @@
 #include "tools/svg_plot.h"
 
 #include <algorithm>
-#include <cerrno>
+#include <cmath>
+#include <cstddef>
 #include <cstdio>
-#include <cstring>
 
 #include "tools/text_escape.h"
 
@@ -11,12 +11,17 @@ namespace cwtool {
 namespace {
 
 constexpr int kWidth = 1000;
-constexpr int kHeight = 400;
-constexpr int kLeft = 40;
-constexpr int kRight = 20;
+constexpr int kLeft = 50;
+constexpr int kRight = 40;  // room for the last time label
 constexpr int kPlotWidth = kWidth - kLeft - kRight;
-constexpr double kWaveTop = 40, kWaveBottom = 200;
-constexpr double kOnsetTop = 215, kOnsetBottom = 355;
+// 91 pixels a second: beats at 240 BPM are still over 20 pixels apart.
+constexpr double kRowSeconds = 10;
+constexpr double kOverviewTop = 48, kOverviewBottom = 108;
+constexpr double kFirstRowTop = 154;
+constexpr double kRowHeight = 150;
+// Within a row.
+constexpr double kWaveTop = 0, kWaveBottom = 70;
+constexpr double kOnsetTop = 76, kOnsetBottom = 114;
 
 template <typename... Args>
 std::string Format(const char* format, Args... args) {
@@ -25,152 +30,171 @@ std::string Format(const char* format, Args... args) {
   return text;
 }
 
-double X(double seconds, double duration) {
-  return kLeft + kPlotWidth * (duration > 0 ? seconds / duration : 0);
-}
+// A stretch of the track drawn across `columns` pixels from x = kLeft.
+struct Span {
+  double start;    // seconds
+  double seconds;  // per kPlotWidth pixels
+  int columns;
 
-// Min and max of the channel mean per pixel column, as an outline that runs
-// right along the maxima and back along the minima.
-std::string Envelope(const DecodedAudio& audio) {
-  const int64_t frames = audio.frames();
-  const int channels = audio.channels;
-  const double middle = (kWaveTop + kWaveBottom) / 2;
-  const double half = (kWaveBottom - kWaveTop) / 2;
-  std::vector<double> low(kPlotWidth), high(kPlotWidth);
-  for (int column = 0; column < kPlotWidth; ++column) {
-    const int64_t begin = frames * column / kPlotWidth;
-    const int64_t end = std::max(begin + 1, frames * (column + 1) / kPlotWidth);
-    double lo = 0, hi = 0;
-    for (int64_t f = begin; f < end && f < frames; ++f) {
-      double sum = 0;
-      for (int c = 0; c < channels; ++c) sum += audio.samples[static_cast<size_t>(f * channels + c)];
-      const double v = sum / channels / 32768.0;
-      lo = std::min(lo, v);
-      hi = std::max(hi, v);
+  double X(double t) const { return kLeft + kPlotWidth * (t - start) / seconds; }
+  // Indices [first, last) of the values at `per_second` under one column.
+  std::pair<size_t, size_t> Under(int column, int32_t per_second, size_t count) const {
+    const double t0 = start + seconds * column / kPlotWidth;
+    const double t1 = start + seconds * (column + 1) / kPlotWidth;
+    const size_t first = std::min(count, static_cast<size_t>(t0 * per_second));
+    const size_t last = std::min(count, std::max(first + 1, static_cast<size_t>(t1 * per_second)));
+    return {first, last};
+  }
+};
+
+// Outline along the highs and back along the lows, scaled to the loudest
+// moment so that quiet tracks stay readable.
+std::string Envelope(const BeatView& view, const Span& span, double top,
+                     double bottom) {
+  float peak = 0;
+  for (size_t i = 0; i < view.envelope_low.size(); ++i) {
+    peak = std::max({peak, -view.envelope_low[i], view.envelope_high[i]});
+  }
+  const double middle = (top + bottom) / 2;
+  const double scale = peak > 0 ? (bottom - top) / 2 / peak : 0;
+  std::vector<double> low(static_cast<size_t>(span.columns), middle);
+  std::vector<double> high(low);
+  for (int c = 0; c < span.columns; ++c) {
+    const auto [first, last] =
+        span.Under(c, view.envelope_per_second, view.envelope_low.size());
+    for (size_t i = first; i < last; ++i) {
+      low[static_cast<size_t>(c)] = std::max(low[static_cast<size_t>(c)], middle - view.envelope_low[i] * scale);
+      high[static_cast<size_t>(c)] = std::min(high[static_cast<size_t>(c)], middle - view.envelope_high[i] * scale);
     }
-    low[static_cast<size_t>(column)] = middle - lo * half;
-    high[static_cast<size_t>(column)] = middle - hi * half;
   }
   std::string path;
-  for (int column = 0; column < kPlotWidth; ++column) {
-    path += Format(column == 0 ? "M%.1f %.1f" : " L%.1f %.1f", kLeft + column + 0.5,
-                   high[static_cast<size_t>(column)]);
+  for (int c = 0; c < span.columns; ++c) {
+    path += Format(c == 0 ? "M%d.5 %.1f" : " L%d.5 %.1f", kLeft + c, high[static_cast<size_t>(c)]);
   }
-  for (int column = kPlotWidth - 1; column >= 0; --column) {
-    path += Format(" L%.1f %.1f", kLeft + column + 0.5, low[static_cast<size_t>(column)]);
+  for (int c = span.columns - 1; c >= 0; --c) {
+    path += Format(" L%d.5 %.1f", kLeft + c, low[static_cast<size_t>(c)]);
   }
   return "<path class=\"wave\" d=\"" + path + " Z\"/>\n";
 }
 
-// The largest onset value per pixel column, scaled to the panel.
-std::string OnsetLine(const std::vector<float>& onset, int32_t fps,
-                      double duration) {
-  if (onset.empty() || fps <= 0 || duration <= 0) return std::string();
-  const float largest = *std::max_element(onset.begin(), onset.end());
-  const double scale = largest > 0 ? 1.0 / largest : 0.0;
-  const int64_t n = static_cast<int64_t>(onset.size());
+// The largest onset value under each column, relative to the track's largest.
+std::string OnsetLine(const BeatView& view, const Span& span, float largest) {
+  if (view.onset.empty() || view.onset_per_second <= 0 || largest <= 0) return std::string();
   std::string points;
-  for (int column = 0; column < kPlotWidth; ++column) {
-    const double t0 = duration * column / kPlotWidth;
-    const double t1 = duration * (column + 1) / kPlotWidth;
-    const int64_t first = std::min<int64_t>(static_cast<int64_t>(t0 * fps), n - 1);
-    const int64_t last = std::clamp<int64_t>(static_cast<int64_t>(t1 * fps), first + 1, n);
-    const float value = *std::max_element(onset.begin() + first, onset.begin() + last);
-    points += Format("%.1f,%.1f ", kLeft + column + 0.5,
-                     kOnsetBottom - (kOnsetBottom - kOnsetTop) * value * scale);
+  for (int c = 0; c < span.columns; ++c) {
+    const auto [first, last] = span.Under(c, view.onset_per_second, view.onset.size());
+    if (first == last) break;
+    const float value = *std::max_element(view.onset.begin() + static_cast<ptrdiff_t>(first),
+                                          view.onset.begin() + static_cast<ptrdiff_t>(last));
+    points += Format("%d.5,%.1f ", kLeft + c,
+                     kOnsetBottom - (kOnsetBottom - kOnsetTop) * value / largest);
   }
   return "<polyline class=\"onset\" points=\"" + points + "\"/>\n";
 }
 
-std::string BeatMarkers(const std::vector<float>& beats, double duration) {
+std::string BeatMarks(const BeatView& view, const Span& span, double top, double bottom) {
   std::string out = "<g class=\"beats\">\n";
-  for (const float beat : beats) {
-    const double x = X(beat, duration);
-    out += Format("<line x1=\"%.1f\" y1=\"%.0f\" x2=\"%.1f\" y2=\"%.0f\"/>\n", x,
-                  kWaveTop, x, kOnsetBottom);
+  const double end = span.start + span.seconds * span.columns / kPlotWidth;
+  for (const float beat : view.beats) {
+    if (beat < span.start || beat >= end) continue;
+    const double x = span.X(beat);
+    out += Format("<line x1=\"%.1f\" y1=\"%.0f\" x2=\"%.1f\" y2=\"%.0f\"/>\n", x, top, x, bottom);
   }
   return out + "</g>\n";
 }
 
-// About ten labelled ticks, on round numbers of seconds.
-std::string TimeAxis(double duration) {
-  static constexpr double kSteps[] = {0.1, 0.2, 0.5, 1,  2,   5,   10,
-                                      20,  30,  60,  120, 300, 600, 1200};
-  double step = kSteps[0];
-  for (const double s : kSteps) {
-    step = s;
-    if (duration / s <= 10) break;
-  }
+std::string TimeLabel(double t, bool minutes) {
+  if (!minutes) return Format("%g", t);
+  const int whole = static_cast<int>(std::lround(t));
+  return Format("%d:%02d", whole / 60, whole % 60);
+}
+
+// Ticks and labels every `step` seconds along y = `at`.
+std::string TimeAxis(const Span& span, double step, double at, bool minutes) {
+  const double end = span.start + span.seconds * span.columns / kPlotWidth;
   std::string out = "<g class=\"axis\">\n";
-  out += Format("<line x1=\"%d\" y1=\"%.0f\" x2=\"%d\" y2=\"%.0f\"/>\n", kLeft,
-                kOnsetBottom, kLeft + kPlotWidth, kOnsetBottom);
-  for (int i = 0; i * step <= duration + 1e-9; ++i) {
-    const double t = i * step;
-    const double x = X(t, duration);
-    out += Format("<line x1=\"%.1f\" y1=\"%.0f\" x2=\"%.1f\" y2=\"%.0f\"/>", x,
-                  kOnsetBottom, x, kOnsetBottom + 5);
-    out += Format(step < 1 ? "<text x=\"%.1f\" y=\"%.0f\">%.1f</text>\n"
-                           : "<text x=\"%.1f\" y=\"%.0f\">%.0f</text>\n",
-                  x, kOnsetBottom + 18, t);
+  out += Format("<line x1=\"%d\" y1=\"%.0f\" x2=\"%d\" y2=\"%.0f\"/>\n", kLeft, at,
+                kLeft + span.columns, at);
+  for (int i = static_cast<int>(std::ceil(span.start / step - 1e-9)); i * step <= end + 1e-9; ++i) {
+    const double x = span.X(i * step);
+    out += Format("<line x1=\"%.1f\" y1=\"%.0f\" x2=\"%.1f\" y2=\"%.0f\"/>", x, at, x, at + 4);
+    out += Format("<text x=\"%.1f\" y=\"%.0f\">", x, at + 16) +
+           TimeLabel(i * step, minutes) + "</text>\n";
   }
-  out += Format("<text x=\"%d\" y=\"%.0f\" class=\"unit\">s</text>\n",
-                kLeft + kPlotWidth, kOnsetBottom + 34);
   return out + "</g>\n";
 }
 
-std::string Title(const BeatPlot& plot) {
-  const std::string tempo =
-      plot.bpm > 0 ? Format("%.1f BPM", plot.bpm) : std::string("tempo unknown");
-  return XmlText(plot.name) + " \xE2\x80\x94 " + tempo + ", " +
-         std::to_string(plot.beats->size()) + " beats";
+// Round steps giving about ten labels over the whole track.
+double OverviewStep(double duration) {
+  static constexpr double kSteps[] = {0.5, 1, 2, 5, 10, 15, 30, 60, 120, 300, 600, 1200};
+  for (const double s : kSteps) {
+    if (duration / s <= 12) return s;
+  }
+  return 3600;
+}
+
+std::string Tempo(double bpm) {
+  return KnownTempo(bpm) ? Format("%.1f BPM", bpm) : std::string("unknown");
+}
+
+std::string Title(const BeatView& view) {
+  return XmlText(view.file) + " \xE2\x80\x94 tempo " + Tempo(view.tempo) +
+         " (tracker " + Tempo(view.tracker_tempo) + "), " +
+         std::to_string(view.beats.size()) + " beats in " + Format("%.1f s", view.duration);
 }
 
 }  // namespace
 
-std::string BeatPlotSvg(const BeatPlot& plot) {
-  const double duration = plot.audio->seconds();
+std::string BeatPlotSvg(const BeatView& view) {
+  const double duration = view.duration;
+  const int rows = std::max(1, static_cast<int>(std::ceil(duration / kRowSeconds - 1e-9)));
+  const int height = static_cast<int>(kFirstRowTop + rows * kRowHeight);
+  const bool minutes = duration >= 60;
+  const float largest_onset =
+      view.onset.empty() ? 0.0f : *std::max_element(view.onset.begin(), view.onset.end());
+
   std::string svg =
       "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
       "<svg xmlns=\"http://www.w3.org/2000/svg\" width=\"" + std::to_string(kWidth) +
-      "\" height=\"" + std::to_string(kHeight) + "\" viewBox=\"0 0 " +
-      std::to_string(kWidth) + " " + std::to_string(kHeight) + "\">\n"
+      "\" height=\"" + std::to_string(height) + "\" viewBox=\"0 0 " +
+      std::to_string(kWidth) + " " + std::to_string(height) + "\">\n"
       "<style>\n"
-      "text { font: 12px sans-serif; fill: #333; }\n"
-      ".title { font-size: 16px; }\n"
+      "text { font: 11px sans-serif; fill: #333; }\n"
+      ".title { font-size: 15px; }\n"
       ".wave { fill: #8aa8c8; stroke: none; }\n"
       ".onset { fill: none; stroke: #2a7a3a; stroke-width: 1; }\n"
-      ".beats line { stroke: #d0302a; stroke-width: 1; stroke-opacity: 0.6; }\n"
-      ".axis line { stroke: #333; }\n"
+      ".beats line { stroke: #d0302a; stroke-width: 1.5; }\n"
+      ".overview .beats line { stroke-width: 1; stroke-opacity: 0.7; }\n"
+      ".axis line { stroke: #555; }\n"
       ".axis text { text-anchor: middle; }\n"
+      ".legend { fill: #666; }\n"
       "</style>\n"
       "<rect width=\"100%\" height=\"100%\" fill=\"white\"/>\n";
-  svg += "<text class=\"title\" x=\"" + std::to_string(kLeft) + "\" y=\"24\">" +
-         Title(plot) + "</text>\n";
-  svg += Envelope(*plot.audio);
-  svg += OnsetLine(*plot.onset, plot.frames_per_second, duration);
-  svg += BeatMarkers(*plot.beats, duration);
-  svg += TimeAxis(duration);
-  svg += Format("<text x=\"%d\" y=\"%.0f\">waveform</text>\n", kLeft + 4, kWaveTop + 12);
-  svg += Format("<text x=\"%d\" y=\"%.0f\">onset strength</text>\n", kLeft + 4,
-                kOnsetTop + 12);
-  return svg + "</svg>\n";
-}
+  svg += Format("<text class=\"title\" x=\"%d\" y=\"22\">", kLeft) + Title(view) + "</text>\n";
+  svg += Format("<text class=\"legend\" x=\"%d\" y=\"38\">", kLeft) +
+         "blue: waveform \xC2\xB7 green: onset strength \xC2\xB7 red: beats</text>\n";
 
-bool WriteBeatPlot(const std::string& path, const BeatPlot& plot,
-                   std::string* error) {
-  const std::string svg = BeatPlotSvg(plot);
-  FILE* file = fopen(path.c_str(), "w");
-  if (file == nullptr) {
-    *error = std::string("cannot write: ") + std::strerror(errno);
-    return false;
+  const Span whole{0, duration, kPlotWidth};
+  svg += "<g class=\"overview\">\n";
+  svg += Envelope(view, whole, kOverviewTop, kOverviewBottom - 10);
+  svg += BeatMarks(view, whole, kOverviewBottom - 8, kOverviewBottom);
+  svg += TimeAxis(whole, OverviewStep(duration), kOverviewBottom, minutes);
+  svg += "</g>\n";
+
+  for (int r = 0; r < rows; ++r) {
+    const double start = r * kRowSeconds;
+    const int columns = static_cast<int>(
+        std::ceil(kPlotWidth * std::min(1.0, (duration - start) / kRowSeconds)));
+    const Span span{start, kRowSeconds, std::max(1, columns)};
+    svg += Format("<g class=\"row\" transform=\"translate(0,%.0f)\">\n",
+                  kFirstRowTop + r * kRowHeight);
+    svg += Envelope(view, span, kWaveTop, kWaveBottom);
+    svg += OnsetLine(view, span, largest_onset);
+    svg += BeatMarks(view, span, kWaveTop, kOnsetBottom);
+    svg += TimeAxis(span, 1, kOnsetBottom, minutes);
+    svg += "</g>\n";
   }
-  const bool written = fwrite(svg.data(), 1, svg.size(), file) == svg.size();
-  const int saved_errno = errno;
-  if (fclose(file) != 0 || !written) {
-    *error = std::string("cannot write: ") + std::strerror(written ? errno : saved_errno);
-    return false;
-  }
-  return true;
+  return svg + "</svg>\n";
 }
 
 }  // namespace cwtool

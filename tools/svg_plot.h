@@ -1,28 +1,16 @@
-// A picture of one analysis: the waveform envelope, the conditioned onset
-// function and the beats, with the tempo in the title.
+// A picture of one analysis: the whole track in a strip on top, then the
+// track in rows of ten seconds with waveform, onset strength and beats, so
+// that each beat can be told from its neighbours.
 #ifndef CLIPWEAVER_TOOLS_SVG_PLOT_H_
 #define CLIPWEAVER_TOOLS_SVG_PLOT_H_
 
-#include <cstdint>
 #include <string>
-#include <vector>
 
-#include "tools/audio_file.h"
+#include "tools/beat_view.h"
 
 namespace cwtool {
 
-struct BeatPlot {
-  std::string name;
-  const DecodedAudio* audio;
-  const std::vector<float>* onset;  // one value per analysis frame
-  int32_t frames_per_second;
-  const std::vector<float>* beats;  // seconds
-  double bpm;                       // 0: unknown
-};
-
-std::string BeatPlotSvg(const BeatPlot& plot);
-bool WriteBeatPlot(const std::string& path, const BeatPlot& plot,
-                   std::string* error);
+std::string BeatPlotSvg(const BeatView& view);
 
 }  // namespace cwtool
 

@@ -63,6 +63,8 @@ class Refusals(unittest.TestCase):
          "--click with several files needs '{}' in its name, e.g. '{}.click.wav'" + USAGE),
         (('beats', 'a.wav', 'sub/a.wav', '--plot', '{}.svg'), 2,
          "--plot '{}.svg' gives the same name 'a.svg' to two inputs" + USAGE),
+        (('beats', 'a.wav', 'b.wav', '--html', 'page.html'), 2,
+         "--html with several files needs '{}' in its name, e.g. '{}.html'" + USAGE),
         (('beats', 'a.wav', '--click', 'a.mp3'), 2, f"--click 'a.mp3': {FORMATS}" + USAGE),
         (('beats', 'a.wav', '--plot', 'a.png'), 2, "--plot 'a.png' does not end in .svg" + USAGE),
         (('resample', 'a.wav', 'out.wav'), 2, 'resample needs --rate HZ' + USAGE),

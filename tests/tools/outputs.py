@@ -19,27 +19,36 @@ class ClickTrackAndPlot(unittest.TestCase):
         assert done.returncode == 0, done.stderr
         cls.result = json.loads(done.stdout)
 
-    def test_plot_is_svg_with_a_marker_per_beat_and_the_tempo(self):
-        root = ElementTree.parse(path('groove.svg')).getroot()
-        self.assertEqual(root.tag, SVG + 'svg')
-        width, height = (float(root.get(k)) for k in ('width', 'height'))
-        title = ''.join(root.find(SVG + 'text').itertext())
-        self.assertIn('120.0 BPM', title)
-        markers = root.findall(f"{SVG}g[@class='beats']/{SVG}line")
-        self.assertEqual(len(markers), len(self.result['beats']))
-        # Markers sit in time order across the plot, from its left edge.
-        xs = [float(m.get('x1')) for m in markers]
-        self.assertEqual(xs, sorted(xs))
-        self.assertLess(xs[-1], width)
-        onset = root.find(f"{SVG}polyline[@class='onset']")
-        points = [tuple(map(float, p.split(',')))
-                  for p in onset.get('points').split()]
-        self.assertGreater(len(points), 500)
-        self.assertTrue(all(0 <= x <= width and 0 <= y <= height
-                            for x, y in points))
-        wave_path = root.find(f"{SVG}path[@class='wave']").get('d')
-        coords = [float(v) for v in re.findall(r'-?\d+(?:\.\d+)?', wave_path)]
-        self.assertTrue(all(0 <= v <= width for v in coords))
+    def test_plot_shows_every_beat_in_its_row_of_ten_seconds(self):
+        short = run('beats', '--format', 'json', example('fast.wav', 150, seconds=25),
+                    '--plot', 'fast.svg')
+        self.assertEqual(short.returncode, 0, short.stderr)
+        for svg, result, rows, bpm in (('groove.svg', self.result, 2, '120.0 BPM'),
+                                       ('fast.svg', json.loads(short.stdout), 3, '150.0 BPM')):
+            with self.subTest(svg):
+                root = ElementTree.parse(path(svg)).getroot()
+                self.assertIn(bpm, ''.join(root.find(SVG + 'text').itertext()))
+                overview = root.find(f"{SVG}g[@class='overview']")
+                self.assertEqual(len(overview.findall(f"{SVG}g[@class='beats']/{SVG}line")),
+                                 len(result['beats']))
+                found = []
+                row_groups = root.findall(f"{SVG}g[@class='row']")
+                self.assertEqual(len(row_groups), rows)
+                for index, row in enumerate(row_groups):
+                    # The time labels give the row's scale.
+                    labels = [(float(t.get('x')), float(t.text))
+                              for t in row.findall(f"{SVG}g[@class='axis']/{SVG}text")]
+                    (x0, t0), (x1, t1) = labels[0], labels[-1]
+                    self.assertEqual(t0, 10 * index)
+                    xs = [float(m.get('x1')) for m in row.findall(f"{SVG}g[@class='beats']/{SVG}line")]
+                    # Distinct marks: several pixels between neighbours.
+                    self.assertTrue(all(b - a > 20 for a, b in zip(xs, xs[1:])), xs)
+                    found += [t0 + (x - x0) * (t1 - t0) / (x1 - x0) for x in xs]
+                    self.assertIsNotNone(row.find(f"{SVG}path[@class='wave']"))
+                    self.assertIsNotNone(row.find(f"{SVG}polyline[@class='onset']"))
+                self.assertEqual(len(found), len(result['beats']))
+                for got, want in zip(found, result['beats']):
+                    self.assertAlmostEqual(got, want, delta=0.002)
 
     def test_click_track_is_the_music_with_a_burst_at_each_beat(self):
         channels, rate, music = read_wav(self.groove)
@@ -67,10 +76,14 @@ class ClickTrackAndPlot(unittest.TestCase):
     def test_several_files_fill_in_the_name_pattern(self):
         other = example('other.flac', 100, 48000, 1)
         os.makedirs(path('plots'), exist_ok=True)
-        done = run('beats', '-q', self.groove, other, '--plot', 'plots/{}.svg')
+        done = run('beats', '-q', self.groove, other, '--plot', 'plots/{}.svg',
+                   '--html', 'plots/{}.html')
         self.assertEqual(done.returncode, 0, done.stderr)
-        for name in ('groove', 'other'):
+        for name, source in (('groove', self.groove), ('other', other)):
             ElementTree.parse(path(f'plots/{name}.svg'))
+            with open(path(f'plots/{name}.html'), encoding='utf-8') as page:
+                data = re.search(r'id="clipweaver-data">(.*?)</script>', page.read()).group(1)
+                self.assertEqual(json.loads(data)['file'], source)
 
     def test_an_output_that_cannot_be_written_fails_the_file_not_its_beats(self):
         done = run('beats', self.groove, '--plot', 'no/such/dir/x.svg')

@@ -1,0 +1,213 @@
+"""The beat viewer page in Chromium, driven through Selenium.
+
+Screenshots of the pages are left in the work directory.
+"""
+import json
+import os
+import time
+import unittest
+import wave
+
+from selenium import webdriver
+from selenium.webdriver.chrome.service import Service
+from selenium.webdriver.common.action_chains import ActionChains
+from selenium.webdriver.common.actions.wheel_input import ScrollOrigin
+from selenium.webdriver.common.by import By
+from selenium.webdriver.common.keys import Keys
+
+from tool_harness import beats_json, example, main, path, run
+
+FLAGS = ('--headless', '--no-sandbox', '--disable-gpu', '--disable-quic', '--no-first-run',
+         '--disable-background-networking', '--disable-component-update', '--disable-sync',
+         '--autoplay-policy=no-user-gesture-required', '--window-size=1200,800')
+DRIVER = None
+
+
+def setUpModule():
+    global DRIVER
+    options = webdriver.ChromeOptions()
+    options.binary_location = '/usr/bin/chromium'
+    for flag in FLAGS:
+        options.add_argument(flag)
+    options.add_argument('--user-data-dir=' + path('profile'))
+    options.set_capability('goog:loggingPrefs', {'browser': 'ALL'})
+    DRIVER = webdriver.Chrome(service=Service('/usr/bin/chromedriver'), options=options)
+
+
+def tearDownModule():
+    DRIVER.quit()
+
+
+def silence(name, seconds):
+    with wave.open(path(name), 'wb') as w:
+        w.setnchannels(1)
+        w.setsampwidth(2)
+        w.setframerate(22050)
+        w.writeframes(bytes(2 * 22050 * seconds))
+    return path(name)
+
+
+def page_of(name, seconds, make=example):
+    """Writes the page of an example groove (or another input); gives its
+    path and the JSON report."""
+    audio = make(name + '.wav', seconds=seconds)
+    done = run('beats', '-q', audio, '--html', name + '.html')
+    assert done.returncode == 0, done.stderr
+    return path(name + '.html'), beats_json(audio)[0]
+
+
+def js(script, *args):
+    return DRIVER.execute_script(script, *args)
+
+
+def open_page(html):
+    DRIVER.get('file://' + html)
+    DRIVER.get_log('browser')  # only what this page logs counts
+
+
+def visible_range():
+    shown = DRIVER.find_element(By.ID, 'range')
+    return float(shown.get_attribute('data-start')), float(shown.get_attribute('data-end'))
+
+
+def audio_time():
+    return js('return document.getElementById("audio").currentTime')
+
+
+class Pages(unittest.TestCase):
+    """The 40-second groove and a 5-minute input: complete, correct, playable."""
+
+    def test_pages_load_draw_play_and_hold_the_reported_beats(self):
+        # Fractions of the canvases' pixels drawn on: a flat line for silence.
+        for name, make, seconds, largest, ink in (
+                ('groove', example, 40, 1_000_000, 0.05),
+                ('five-minutes', example, 300, 6_000_000, 0.05),
+                ('silence', silence, 3, 100_000, 0.001)):
+            with self.subTest(name):
+                html, report = page_of(name, seconds, make)
+                self.assertLessEqual(os.path.getsize(html), largest)
+                with open(html, encoding='utf-8') as page:
+                    self.assertNotIn('://', page.read())  # nothing fetched from anywhere
+                open_page(html)
+                data = json.loads(js('return document.getElementById("clipweaver-data").textContent'))
+                for key in ('file', 'duration', 'sample_rate', 'channels', 'tempo', 'beats'):
+                    self.assertEqual(data[key], report[key], key)
+                if report['tempo'] is None:
+                    self.assertIsNone(data['tracker_tempo'])
+                else:
+                    self.assertAlmostEqual(data['tracker_tempo'], report['tempo'], delta=1)
+                # Both views have drawn something.
+                for canvas in ('overview', 'detail'):
+                    inked = js('const c = document.getElementById(arguments[0]);'
+                               'const d = c.getContext("2d").getImageData(0, 0, c.width, c.height).data;'
+                               'let n = 0; for (let i = 3; i < d.length; i += 4) n += d[i] > 0;'
+                               'return n / (c.width * c.height);', canvas)
+                    self.assertGreater(inked, ink, canvas)
+                self.assertAlmostEqual(js('return document.getElementById("audio").duration'),
+                                       seconds, delta=0.1)
+                DRIVER.find_element(By.ID, 'play').click()
+                time.sleep(1.5)
+                self.assertGreater(audio_time(), 0.5)
+                self.assertEqual(DRIVER.find_element(By.ID, 'play').text, 'Pause')
+                DRIVER.find_element(By.ID, 'play').click()
+                self.assertEqual(DRIVER.find_element(By.ID, 'play').text, 'Play')
+                DRIVER.save_screenshot(path(name + '.png'))
+                self.assertEqual([entry for entry in DRIVER.get_log('browser')
+                                  if entry['level'] in ('SEVERE', 'WARNING')], [])
+
+
+class Controls(unittest.TestCase):
+    """Zooming, panning, seeking and the clicks, on the groove (120 BPM, 40 s)."""
+
+    @classmethod
+    def setUpClass(cls):
+        cls.html, cls.report = page_of('groove', 40)
+
+    def setUp(self):
+        open_page(self.html)
+        self.detail = DRIVER.find_element(By.ID, 'detail')
+        self.assertEqual(visible_range(), (0, 10))
+
+    def tearDown(self):
+        self.assertEqual([e for e in DRIVER.get_log('browser') if e['level'] == 'SEVERE'], [])
+
+    def test_zoom_and_pan_move_the_visible_range(self):
+        def press(key):
+            return lambda: ActionChains(DRIVER).send_keys(key).perform()
+
+        def button(name):
+            return lambda: DRIVER.find_element(By.ID, name).click()
+
+        # Zooming keeps the middle (or the point under the wheel) in place.
+        cases = (
+            ('zoom-in button', button('zoom-in'), (5 - 10 / 3, 5 + 10 / 3)),
+            ('+ key', press('+'), (5 - 10 / 3, 5 + 10 / 3)),
+            ('zoom-out from the start', button('zoom-out'), (0, 15)),
+            ('- key', press('-'), (0, 15)),
+            ('right arrow', press(Keys.ARROW_RIGHT), (2, 12)),
+            ('left arrow at the start', press(Keys.ARROW_LEFT), (0, 10)),
+        )
+        for name, action, expected in cases:
+            with self.subTest(name):
+                open_page(self.html)
+                action()
+                for got, want in zip(visible_range(), expected):
+                    self.assertAlmostEqual(got, want, delta=0.002)
+
+        open_page(self.html)
+        detail = DRIVER.find_element(By.ID, 'detail')
+        ActionChains(DRIVER).scroll_from_origin(ScrollOrigin.from_element(detail), 0, -300).perform()
+        start, end = visible_range()
+        self.assertLess(end - start, 9)
+        self.assertAlmostEqual((start + end) / 2, 5, delta=0.1)  # the wheel was at the middle
+
+    def test_a_click_seeks_and_a_drag_pans(self):
+        width = self.detail.size['width']
+        # Offsets count from the middle of the element.
+        ActionChains(DRIVER).move_to_element_with_offset(self.detail, width // 4, 0).click().perform()
+        self.assertAlmostEqual(audio_time(), 7.5, delta=10 / width * 2)
+        self.assertEqual(visible_range(), (0, 10))
+        ActionChains(DRIVER).move_to_element(self.detail).click_and_hold() \
+            .move_by_offset(-width // 4, 0).move_by_offset(-width // 4, 0).release().perform()
+        start, end = visible_range()
+        self.assertAlmostEqual(start, 5, delta=0.05)
+        self.assertAlmostEqual(end - start, 10, delta=0.001)
+        self.assertAlmostEqual(audio_time(), 7.5, delta=10 / width * 2)
+
+    def test_the_view_turns_the_page_when_the_cursor_runs_off_it(self):
+        width = self.detail.size['width']
+        ActionChains(DRIVER).move_to_element_with_offset(self.detail, width * 45 // 100, 0) \
+            .click().perform()
+        DRIVER.find_element(By.ID, 'play').click()
+        time.sleep(1.5)
+        DRIVER.find_element(By.ID, 'play').click()
+        start, end = visible_range()
+        self.assertGreater(start, 9)
+        self.assertLess(start, audio_time())
+        self.assertAlmostEqual(end - start, 10, delta=0.001)
+
+    def test_the_click_toggle_queues_each_beat_once_just_ahead_of_the_cursor(self):
+        beats = self.report['beats']
+        ActionChains(DRIVER).move_to_element(self.detail).click().perform()
+        seeked = audio_time()
+        DRIVER.find_element(By.ID, 'clicks').click()
+        DRIVER.find_element(By.ID, 'play').click()
+        time.sleep(3)
+        DRIVER.find_element(By.ID, 'play').click()
+        stopped = audio_time()
+        queued = js('return window.clipweaver.scheduledClicks')
+        played = [b for b in beats if seeked <= b < stopped]
+        self.assertGreater(len(played), 4)
+        # Every beat from the seek on, in order, none twice; past the pause
+        # at most the next one (beats are 0.5 s apart, the queue 0.3 s long).
+        got = [q['beat'] for q in queued]
+        first = beats.index(played[0])
+        self.assertEqual(got, beats[first:first + len(got)])
+        self.assertIn(len(got) - len(played), (0, 1))
+        for q in queued:
+            self.assertGreaterEqual(q['beat'], q['cursor'])
+            self.assertLess(q['beat'] - q['cursor'], 0.31)
+
+
+if __name__ == '__main__':
+    main()
