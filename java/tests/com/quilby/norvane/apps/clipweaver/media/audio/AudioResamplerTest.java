@@ -3,9 +3,12 @@ package com.quilby.norvane.apps.clipweaver.media.audio;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertNotEquals;
+import static org.junit.jupiter.api.Assertions.assertNull;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 
 import com.quilby.norvane.apps.clipweaver.testing.ChildJvm;
+import java.lang.ref.WeakReference;
+import java.lang.reflect.Field;
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
 import java.util.ArrayList;
@@ -79,16 +82,6 @@ public class AudioResamplerTest {
     AudioResampler.releaseNativeResampler(monoToStereo);
   }
 
-  @Test
-  void freshInstancePassesStereoThroughAtUnitGainOneFrameLate() {
-    ByteBuffer context = created(2, 48000, false);
-    byte[] output = new byte[12];
-    AudioResampler.resampleFromByteArray(
-        context, pcm(100, -100, 200, -200, 300, -300), 0, 6, output, 3, false);
-    assertArrayEquals(new short[] {0, 0, 100, -100, 200, -200}, samples(output));
-    AudioResampler.releaseNativeResampler(context);
-  }
-
   @ParameterizedTest(name = "{0} channels, stereo output {1}: {2} bytes")
   @CsvSource({"2, false, 400", "2, true, 400", "1, true, 400", "1, false, 200"})
   void clearsTwoBytesPerOutputSampleOfTheFramesAsked(int channels, boolean stereo, int bytes) {
@@ -153,16 +146,6 @@ public class AudioResamplerTest {
     AudioResampler.releaseNativeResampler(context);
   }
 
-  @Test
-  void heapInputBufferLeavesTheOutputUntouched() {
-    ByteBuffer context = created(2, 48000, false);
-    byte[] output = filled(100);
-    AudioResampler.resampleFromByteBuffer(
-        context, ByteBuffer.wrap(pcm(1, 2, 3, 4)), 0, 4, output, 20, false);
-    assertArrayEquals(filled(100), output);
-    AudioResampler.releaseNativeResampler(context);
-  }
-
   // Each case is a call that would read or write out of bounds, or has no
   // usable context: the output stays as it was.
   @ParameterizedTest(name = "{0}")
@@ -199,25 +182,68 @@ public class AudioResamplerTest {
   }
 
   @Test
-  void unusableContextsAreIgnored() {
+  void unusableContextsAndInputsAreIgnored() {
     ByteBuffer small = ByteBuffer.allocateDirect(8);
     ByteBuffer heap = ByteBuffer.allocate(16);
-    for (ByteBuffer context : new ByteBuffer[] {small, heap, context(), null}) {
+    for (ByteBuffer context : new ByteBuffer[] {small, heap, null}) {
       AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
       AudioResampler.setVolume(context, 1, 1);
       AudioResampler.setSourceSampleRate(context, 44100);
       byte[] output = filled(20);
       AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
-      if (context != null && context.isDirect() && context.capacity() >= 16) {
-        assertNotEquals(0L, context.getLong(0));
-        AudioResampler.releaseNativeResampler(context);
-        continue;
-      }
       assertArrayEquals(filled(20), output);
       AudioResampler.releaseNativeResampler(context);
     }
     assertEquals(0L, small.getLong(0));
     assertEquals(0L, heap.getLong(0));
+
+    ByteBuffer context = created(2, 48000, false);
+    byte[] output = filled(100);
+    AudioResampler.resampleFromByteBuffer(
+        context, ByteBuffer.wrap(pcm(1, 2, 3, 4)), 0, 4, output, 20, false);
+    assertArrayEquals(filled(100), output);
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  // A context rewritten after creation: the bridge must go by its instance,
+  // and refuse every call until the fields agree again.
+  @ParameterizedTest(name = "byte {0} set to {1}")
+  @CsvSource({"8, 1", "8, 0", "8, 3", "12, 1", "12, 2"})
+  void tamperedContextIsRefused(int at, int value) {
+    ByteBuffer context = created(2, 44100, false);
+    byte[] input = new byte[4000];
+    Arrays.fill(input, (byte) 0x11);
+    byte[] output = filled(16000);
+    if (at == 8) context.putInt(at, value); else context.put(at, (byte) value);
+    AudioResampler.setVolume(context, 0, 0);
+    AudioResampler.resampleFromByteArray(context, input, 0, 2000, output, 0, true);
+    AudioResampler.resampleFromByteBuffer(context, direct(input), 0, 2000, output, 100, false);
+    AudioResampler.releaseNativeResampler(context);
+    assertArrayEquals(filled(16000), output);
+    assertNotEquals(0L, context.getLong(0));
+
+    context.putInt(8, 2).put(12, (byte) 0);
+    AudioResampler.resampleFromByteArray(context, input, 0, 8, output, 4, false);
+    // Still at unit gain: the one-frame delay, then the input.
+    assertArrayEquals(new short[] {0, 0, 0x1111, 0x1111}, Arrays.copyOf(samples(output), 4));
+    AudioResampler.releaseNativeResampler(context);
+    assertEquals(0L, context.getLong(0));
+  }
+
+  @Test
+  void cleanerReleasesAnInstanceNeverClosed() throws Exception {
+    AudioResampler resampler = new AudioResampler(1, 48000, false);
+    Field field = AudioResampler.class.getDeclaredField("context");
+    field.setAccessible(true);
+    ByteBuffer context = (ByteBuffer) field.get(resampler);
+    WeakReference<AudioResampler> reference = new WeakReference<>(resampler);
+    resampler = null;
+    for (int i = 0; i < 200 && context.getLong(0) != 0; i++) {
+      System.gc();
+      Thread.sleep(10);
+    }
+    assertNull(reference.get());
+    assertEquals(0L, context.getLong(0), "the instance was not released");
   }
 
   @Test
@@ -280,10 +306,12 @@ public class AudioResamplerTest {
         List.of(
             "AudioResampler : Unsupported sample format, 8 bits, 1 channels",
             "AudioResampler : Unsupported resampling from 0 Hz to 48000 Hz: no output",
-            "native : audio_resampler_jni.cc: Resampler output of 10 bytes is too small for"
+            "native : resampler_bridge.cc: Resampler output of 10 bytes is too small for"
                 + " 2000 bytes to clear and 0 bytes to resample: nothing resampled.",
-            "native : audio_resampler_jni.cc: Resampler input of 8 samples at byte 0 exceeds"
-                + " the 4 bytes given: nothing resampled."),
+            "native : resampler_bridge.cc: Resampler input of 8 samples at byte 0 exceeds"
+                + " the 4 bytes given: nothing resampled.",
+            "native : resampler_bridge.cc: Bad resampler context: it holds 2 channels and"
+                + " stereo flag 0, its instance was made with 1 and 0: call ignored."),
         lines);
   }
 
@@ -300,6 +328,9 @@ public class AudioResamplerTest {
       AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
       AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 1000, false);
       AudioResampler.resampleFromByteBuffer(context, direct(pcm(1, 2)), 0, 8, output, 0, false);
+      context.putInt(8, 2);
+      AudioResampler.setVolume(context, 1, 1);
+      context.putInt(8, 1);
       AudioResampler.releaseNativeResampler(context);
     }
   }
