@@ -1,7 +1,6 @@
 #include "base/logging.h"
 
 #include <cerrno>
-#include <cstdio>
 #include <cstdlib>
 #include <cstring>
 
@@ -62,8 +61,9 @@ LogMessage::~LogMessage() {
   line += buffer_.text();
   line += '\n';
 
-  platform_log::Write(PlatformPriority(severity_), kTag, line.c_str());
-  fprintf(stderr, "%s : %s", kTag, line.c_str());
+  const int priority = PlatformPriority(severity_);
+  platform_log::Write(priority, kTag, line.c_str());
+  platform_log::EmitStderrLine(priority, (std::string(kTag) + " : " + line).c_str());
   if (severity_ == FATAL) {
     platform_log::Write(platform_log::kFatal, kTag, "terminating.\n");
     abort();

@@ -5,9 +5,10 @@
 //
 // A statement becomes one line "file:line text" (file = the source file's
 // name without directories), written to the platform log with the tag
-// "native" and to stderr as "native : file:line text". errno is the same
-// after a statement as before it. FATAL statements, and so failed CHECKs,
-// log "terminating." and abort; they never return.
+// "native" and to stderr as "native : file:line text" (through the sink of
+// platform_log.h). errno is the same after a statement as before it. FATAL
+// statements, and so failed CHECKs, log "terminating." and abort; they never
+// return.
 #ifndef CLIPWEAVER_BASE_LOGGING_H_
 #define CLIPWEAVER_BASE_LOGGING_H_
 

@@ -27,6 +27,18 @@ void Print(int priority, const char* tag, const char* format, ...)
                          const char* format, ...)
     __attribute__((format(printf, 3, 4)));
 
+// Where the lines meant for stderr go: each arrives finished, newline
+// included. Programs that link the library directly (the tool, fuzzers) set
+// their own to keep the lines off their terminal; the JVM's library never
+// does, so there every line reaches stderr. Callable from any thread; lines
+// already being written may still take the old sink.
+using StderrSink = void (*)(int priority, const char* line);
+void SetStderrSink(StderrSink sink);
+// The initial sink.
+void WriteToStderr(int priority, const char* line);
+// Hands one line to the current sink.
+void EmitStderrLine(int priority, const char* line);
+
 }  // namespace platform_log
 
 #endif  // CLIPWEAVER_BASE_PLATFORM_LOG_H_

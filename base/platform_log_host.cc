@@ -9,13 +9,15 @@ namespace platform_log {
 
 void Write(int, const char*, const char*) {}
 
-void Print(int, const char* tag, const char* format, ...) {
+void Print(int priority, const char* tag, const char* format, ...) {
   char text[1024];
   va_list args;
   va_start(args, format);
   vsnprintf(text, sizeof(text), format, args);
   va_end(args);
-  fprintf(stderr, "%s : %s\n", tag, text);
+  char line[1100];
+  snprintf(line, sizeof(line), "%s : %s\n", tag, text);
+  EmitStderrLine(priority, line);
 }
 
 void Assert(const char* condition, const char* tag, const char* format, ...) {
@@ -24,7 +26,9 @@ void Assert(const char* condition, const char* tag, const char* format, ...) {
   va_start(args, format);
   vsnprintf(text, sizeof(text), format, args);
   va_end(args);
-  fprintf(stderr, "%s : %s (%s)\n", tag, text, condition);
+  char line[1400];
+  snprintf(line, sizeof(line), "%s : %s (%s)\n", tag, text, condition);
+  EmitStderrLine(kFatal, line);
   abort();
 }
 

@@ -118,8 +118,7 @@ AudioResampler::~AudioResampler() {
 
 void AudioResampler::setSourceSampleRate(int32_t rate) {
   inputSampleRate = rate;
-  // Outside the supported ratios the increment would not fit 32 bits.
-  phaseIncrement = ratesSupported()
+  phaseIncrement = ratesSupported(rate, outputSampleRate)
                        ? static_cast<uint32_t>(static_cast<double>(rate) *
                                                1073741824.0 / outputSampleRate)
                        : 0;
@@ -138,11 +137,20 @@ void AudioResampler::setPresentationTime(int64_t time) { presentationTime = time
 
 void AudioResampler::reset() { phaseFraction = 0; }
 
+bool AudioResampler::ratesSupported(int32_t inputRate, int32_t outputRate) {
+  return inputRate > 0 && outputRate > 0 &&
+         static_cast<int64_t>(inputRate) <= kMaxRateRatio * static_cast<int64_t>(outputRate);
+}
+
+uint64_t AudioResampler::outputFrameCount(int32_t inputRate, int32_t outputRate,
+                                          uint64_t inputFrameCount) {
+  if (!ratesSupported(inputRate, outputRate)) return 0;
+  return static_cast<uint64_t>(outputRate) * inputFrameCount / static_cast<uint64_t>(inputRate);
+}
+
 uint64_t AudioResampler::getOutputSampleCount(size_t inputFrameCount) const {
-  if ((channelCount != 1 && channelCount != 2) || !ratesSupported()) return 0;
-  const uint64_t frames =
-      static_cast<uint64_t>(static_cast<int64_t>(outputSampleRate)) *
-      inputFrameCount / static_cast<uint64_t>(inputSampleRate);
+  if (channelCount != 1 && channelCount != 2) return 0;
+  const uint64_t frames = outputFrameCount(inputSampleRate, outputSampleRate, inputFrameCount);
   return channelCount == 2 || stereoOutput ? 2 * frames : frames;
 }
 
@@ -153,15 +161,8 @@ uint32_t AudioResampler::getCurrentLoadMHz() {
   return load;
 }
 
-bool AudioResampler::ratesSupported() const {
-  // Fraction plus increment must stay below 2^32: at most three input frames
-  // per output frame.
-  return inputSampleRate > 0 && outputSampleRate > 0 &&
-         static_cast<int64_t>(inputSampleRate) <= 3 * static_cast<int64_t>(outputSampleRate);
-}
-
 bool AudioResampler::checkRates() {
-  if (ratesSupported()) return true;
+  if (ratesSupported(inputSampleRate, outputSampleRate)) return true;
   if (!rateErrorLogged) {
     platform_log::Print(platform_log::kError, kTag,
                         "Unsupported resampling from %d Hz to %d Hz: no output",

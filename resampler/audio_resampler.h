@@ -45,10 +45,21 @@ class AudioResampler {
                         size_t inputFrameCount) = 0;
   virtual void reset();
 
+  // The largest source rate, as a multiple of the output rate: beyond it the
+  // 30-bit phase plus its increment would not fit 32 bits.
+  static constexpr int kMaxRateRatio = 3;
+  static bool ratesSupported(int32_t inputRate, int32_t outputRate);
+  // Frames a block of inputFrameCount frames yields at most:
+  // floor(outputRate * inputFrameCount / inputRate), 0 for unsupported rates.
+  static uint64_t outputFrameCount(int32_t inputRate, int32_t outputRate,
+                                   uint64_t inputFrameCount);
+
   // Samples (not frames) that resample() writes at most for this many input
   // frames with the current rates; 0 when it would write nothing.
   uint64_t getOutputSampleCount(size_t inputFrameCount) const;
 
+  int32_t getChannelCount() const { return channelCount; }
+  bool isStereoOutput() const { return stereoOutput; }
   int32_t getInputSampleRate() const { return inputSampleRate; }
   int32_t getOutputSampleRate() const { return outputSampleRate; }
   float getLeftVolume() const { return leftVolume; }
@@ -88,8 +99,6 @@ class AudioResampler {
   const src_quality quality;
 
  private:
-  bool ratesSupported() const;
-
   bool rateErrorLogged = false;
 };
 

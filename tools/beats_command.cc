@@ -8,13 +8,13 @@
 #include <thread>
 #include <vector>
 
+#include "base/platform_log.h"
 #include "tools/beat_analysis.h"
 #include "tools/console.h"
 #include "tools/interrupt.h"
 #include "tools/ordered_batch.h"
 #include "tools/output_collisions.h"
 #include "tools/report.h"
-#include "tools/stderr_silencer.h"
 #include "tools/text_escape.h"
 
 namespace cwtool {
@@ -62,11 +62,10 @@ int RunBeats(const BeatsOptions& options) {
   const int workers = static_cast<int>(
       std::min<size_t>(count, static_cast<size_t>(options.jobs > 0 ? options.jobs : cores)));
 
-  // The tool's own messages keep the real stderr; the library's lines go to
-  // /dev/null unless asked for.
   const int err_fd = fcntl(STDERR_FILENO, F_DUPFD_CLOEXEC, 0);
   const bool bars = !options.quiet && !options.verbose && isatty(err_fd);
-  StderrSilencer silencer(!options.verbose);
+  // The library's lines are for those who ask for them.
+  if (!options.verbose) platform_log::SetStderrSink([](int, const char*) {});
   const std::atomic<bool>& interrupted = InterruptFlag();
 
   int failures = 0;

@@ -43,15 +43,16 @@ bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
              " channels (the resampler takes mono or stereo)";
     return false;
   }
-  // The phase increment holds at most a threefold step per output frame.
-  if (static_cast<int64_t>(in_rate) > 3 * static_cast<int64_t>(settings.rate)) {
+  if (!norvane::AudioResampler::ratesSupported(in_rate, settings.rate)) {
     *error = settings.input + ": " + std::to_string(in_rate) + " Hz to " +
              std::to_string(settings.rate) +
              " Hz is more than the 3:1 reduction the resampler allows";
     return false;
   }
   const int64_t expected =
-      reader.frames() < 0 ? -1 : reader.frames() * settings.rate / in_rate;
+      reader.frames() < 0 ? -1
+                          : static_cast<int64_t>(norvane::AudioResampler::outputFrameCount(
+                                in_rate, settings.rate, static_cast<uint64_t>(reader.frames())));
   AudioWriter writer;
   if (!writer.Open(settings.output, settings.rate, channels, expected, error)) {
     *error = settings.output + ": " + *error;
@@ -68,13 +69,15 @@ bool ResampleFile(const ResampleSettings& settings, int64_t* frames_written,
   const int64_t in_block = InputBlockFrames(in_rate, settings.rate);
   std::vector<int16_t> input(static_cast<size_t>(in_block * channels));
   std::vector<int16_t> output(static_cast<size_t>(
-      (in_block * settings.rate / in_rate + 1) * channels));
+      norvane::AudioResampler::outputFrameCount(in_rate, settings.rate, in_block) *
+      channels));
   *frames_written = 0;
   for (;;) {
     if (Interrupted()) return false;
     const int64_t got = reader.Read(input.data(), in_block);
     if (got == 0) break;
-    const int64_t made = got * settings.rate / in_rate;
+    const int64_t made = static_cast<int64_t>(
+        norvane::AudioResampler::outputFrameCount(in_rate, settings.rate, got));
     std::fill_n(output.begin(), made * channels, int16_t{0});
     resampler->resample(output.data(), input.data(), static_cast<size_t>(got));
     if (!writer.Write(output.data(), made, error)) {

@@ -3,6 +3,9 @@
 #include <gtest/gtest.h>
 
 #include <cerrno>
+#include <string>
+
+#include "base/platform_log.h"
 
 namespace {
 
@@ -35,6 +38,23 @@ TEST(Logging, KeepsErrno) {
   LOG(WARNING) << "x";
   testing::internal::GetCapturedStderr();
   EXPECT_EQ(errno, EAGAIN);
+}
+
+std::string sunk;
+
+TEST(Logging, SinkTakesTheStderrLinesWithTheirPriority) {
+  platform_log::SetStderrSink([](int priority, const char* line) {
+    sunk += std::to_string(priority) + "|" + line;
+  });
+  const int line = __LINE__ + 2;
+  const std::string log = Captured([] {
+    LOG(WARNING) << "w";
+    platform_log::Print(6, "Tag", "%d", 7);
+  });
+  platform_log::SetStderrSink(nullptr);
+  EXPECT_EQ(log, "");
+  EXPECT_EQ(sunk, "5|native : logging_test.cc:" + std::to_string(line) + " w\n6|Tag : 7\n");
+  EXPECT_EQ(Captured([] { LOG(INFO) << "back"; }).substr(0, 9), "native : ");
 }
 
 TEST(LoggingDeathTest, FailedCheckAndFatalAbort) {

@@ -1,5 +1,6 @@
 package com.quilby.norvane.apps.clipweaver.media.audio;
 
+import java.lang.ref.Cleaner;
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
 
@@ -18,14 +19,19 @@ import java.nio.ByteOrder;
  * before the input (the stream is delayed by up to one input frame). Sums that leave the
  * 16-bit range wrap around; nothing clamps them.
  *
- * <p>An instance holds native memory until {@link #close()}: use try-with-resources. Its
- * methods are synchronized, so it may be handed between threads, but one stream has one
+ * <p>An instance holds native memory until {@link #close()}: use try-with-resources. An
+ * instance that becomes unreachable unclosed is freed by a {@link Cleaner} at some later
+ * garbage collection, which may be much later or never; close() frees at once. Its methods
+ * are synchronized, so it may be handed between threads, but one stream has one
  * order of blocks: drive it from one thread at a time. Different instances are independent.
  *
  * <p>The static {@code native} methods are the raw bridge beneath this class: they take a
  * caller-owned direct buffer of {@link #getNativeResamplerContextSize()} bytes as the
  * context, check nothing on the Java side, and on bad input log one native error line and
- * leave the output untouched instead of throwing. Prefer the instance methods.
+ * leave the output untouched instead of throwing. The native side takes every bound from the
+ * instance itself: a context whose channel count or stereo flag no longer matches its
+ * instance is refused as a whole (one error line; nothing read, written or released). Prefer
+ * the instance methods.
  */
 public final class AudioResampler implements AutoCloseable {
   static {
@@ -36,11 +42,13 @@ public final class AudioResampler implements AutoCloseable {
   public static final int MAX_RATE_RATIO = 3;
 
   private static final int BYTES_PER_SAMPLE = 2;
+  private static final Cleaner CLEANER = Cleaner.create();
 
   private final ByteBuffer context;
   private final int channelCount;
   private final int outputSampleRate;
   private final boolean stereoOutput;
+  private final Cleaner.Cleanable release;
   private int sourceSampleRate;
   private boolean closed;
 
@@ -67,6 +75,21 @@ public final class AudioResampler implements AutoCloseable {
     this.sourceSampleRate = outputSampleRate;
     context = ByteBuffer.allocateDirect(getNativeResamplerContextSize()).order(ByteOrder.nativeOrder());
     createNativeResampler(context, BYTES_PER_SAMPLE, channelCount, outputSampleRate, stereoOutput);
+    release = CLEANER.register(this, new Release(context));
+  }
+
+  /** Must not refer to the resampler, or it would keep it reachable. */
+  private static final class Release implements Runnable {
+    private final ByteBuffer context;
+
+    Release(ByteBuffer context) {
+      this.context = context;
+    }
+
+    @Override
+    public void run() {
+      releaseNativeResampler(context);
+    }
   }
 
   public int getChannelCount() {
@@ -98,7 +121,7 @@ public final class AudioResampler implements AutoCloseable {
    */
   public synchronized void setSourceSampleRate(int sampleRate) {
     checkOpen();
-    if (sampleRate <= 0 || (long) sampleRate > (long) MAX_RATE_RATIO * outputSampleRate) {
+    if (!ratesSupported(sampleRate, outputSampleRate)) {
       throw new IllegalArgumentException(
           "source rate " + sampleRate + " Hz outside 1 to " + MAX_RATE_RATIO + " x "
               + outputSampleRate + " Hz");
@@ -125,8 +148,16 @@ public final class AudioResampler implements AutoCloseable {
    * when the position carried from the previous block runs out of input first.
    */
   public synchronized int getOutputFrameCount(int inputFrames) {
-    if (inputFrames <= 0) return 0;
-    return (int) Math.min(Integer.MAX_VALUE, (long) outputSampleRate * inputFrames / sourceSampleRate);
+    return (int) Math.min(Integer.MAX_VALUE, outputFrames(inputFrames));
+  }
+
+  private static boolean ratesSupported(int sourceRate, int outputRate) {
+    return sourceRate > 0 && outputRate > 0
+        && (long) sourceRate <= (long) MAX_RATE_RATIO * outputRate;
+  }
+
+  private long outputFrames(int inputFrames) {
+    return inputFrames <= 0 ? 0 : (long) outputSampleRate * inputFrames / sourceSampleRate;
   }
 
   /**
@@ -181,7 +212,7 @@ public final class AudioResampler implements AutoCloseable {
   public synchronized void close() {
     if (closed) return;
     closed = true;
-    releaseNativeResampler(context);
+    release.clean();
   }
 
   private void checkOpen() {
@@ -200,7 +231,7 @@ public final class AudioResampler implements AutoCloseable {
       throw new IndexOutOfBoundsException("negative outputFrameCount " + outputFrameCount);
     }
     long cleared = accumulate ? 0 : outputFrameCount;
-    long written = (long) outputSampleRate * (inputSamples / channelCount) / sourceSampleRate;
+    long written = outputFrames(inputSamples / channelCount);
     long bytes = Math.max(cleared, written) * BYTES_PER_SAMPLE * getOutputChannelCount();
     if (bytes > output.length) {
       throw new IndexOutOfBoundsException(

@@ -3,9 +3,12 @@ package com.quilby.norvane.apps.clipweaver.media.audio;
 import static org.junit.jupiter.api.Assertions.assertArrayEquals;
 import static org.junit.jupiter.api.Assertions.assertEquals;
 import static org.junit.jupiter.api.Assertions.assertNotEquals;
+import static org.junit.jupiter.api.Assertions.assertNull;
 import static org.junit.jupiter.api.Assertions.assertThrows;
 
 import com.quilby.norvane.apps.clipweaver.testing.ChildJvm;
+import java.lang.ref.WeakReference;
+import java.lang.reflect.Field;
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
 import java.util.ArrayList;
@@ -67,26 +70,8 @@ public class AudioResamplerTest {
     ByteBuffer monoToStereo = created(1, 44100, true);
     assertEquals(1, monoToStereo.getInt(8));
     assertEquals(1, monoToStereo.get(12));
-
     AudioResampler.releaseNativeResampler(stereo);
-    assertEquals(0L, stereo.getLong(0));
-    AudioResampler.releaseNativeResampler(stereo);
-    AudioResampler.setVolume(stereo, 2, 2);
-    AudioResampler.setSourceSampleRate(stereo, 44100);
-    byte[] output = filled(40);
-    AudioResampler.resampleFromByteArray(stereo, pcm(1, 2, 3, 4), 0, 4, output, 10, false);
-    assertArrayEquals(filled(40), output);
     AudioResampler.releaseNativeResampler(monoToStereo);
-  }
-
-  @Test
-  void freshInstancePassesStereoThroughAtUnitGainOneFrameLate() {
-    ByteBuffer context = created(2, 48000, false);
-    byte[] output = new byte[12];
-    AudioResampler.resampleFromByteArray(
-        context, pcm(100, -100, 200, -200, 300, -300), 0, 6, output, 3, false);
-    assertArrayEquals(new short[] {0, 0, 100, -100, 200, -200}, samples(output));
-    AudioResampler.releaseNativeResampler(context);
   }
 
   @ParameterizedTest(name = "{0} channels, stereo output {1}: {2} bytes")
@@ -98,10 +83,6 @@ public class AudioResamplerTest {
     byte[] expected = filled(1000);
     Arrays.fill(expected, 0, bytes, (byte) 0);
     assertArrayEquals(expected, output);
-
-    byte[] kept = filled(1000);
-    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, kept, 100, true);
-    assertArrayEquals(filled(1000), kept);
     AudioResampler.releaseNativeResampler(context);
   }
 
@@ -153,37 +134,34 @@ public class AudioResamplerTest {
     AudioResampler.releaseNativeResampler(context);
   }
 
-  @Test
-  void heapInputBufferLeavesTheOutputUntouched() {
-    ByteBuffer context = created(2, 48000, false);
-    byte[] output = filled(100);
-    AudioResampler.resampleFromByteBuffer(
-        context, ByteBuffer.wrap(pcm(1, 2, 3, 4)), 0, 4, output, 20, false);
-    assertArrayEquals(filled(100), output);
-    AudioResampler.releaseNativeResampler(context);
-  }
-
-  // Each case is a call that would read or write out of bounds, or has no
-  // usable context: the output stays as it was.
+  // Each case is a call that would read or write out of bounds, or whose
+  // context was rewritten (byte `at` set to `value`) so that its fields no
+  // longer match the instance: the output stays as it was.
   @ParameterizedTest(name = "{0}")
   @CsvSource({
-    "clearing beyond the output, 2, 0, 4, 40, 11, false",
-    "samples beyond the output, 2, 0, 882, 40, 0, true",
-    "negative offset, 2, -2, 4, 40, 2, false",
-    "negative length, 2, 0, -4, 40, 2, false",
-    "length beyond the input, 2, 2, 882, 4000, 2, false",
-    "offset beyond the input, 2, 1765, 0, 40, 2, false",
-    "huge length, 2, 0, 2147483647, 40, 2, false",
-    "negative clearing, 2, 0, 4, 400, -1, false",
-    "huge clearing, 2, 0, 4, 400, 2147483647, false",
-    "no channels, 0, 0, 4, 40, 2, false",
-    "negative channels, -2, 0, 4, 40, 2, false",
+    "clearing beyond the output, 2, 0, 4, 40, 11, false, 0, 0",
+    "samples beyond the output, 2, 0, 882, 40, 0, true, 0, 0",
+    "negative offset, 2, -2, 4, 40, 2, false, 0, 0",
+    "negative length, 2, 0, -4, 40, 2, false, 0, 0",
+    "length beyond the input, 2, 2, 882, 4000, 2, false, 0, 0",
+    "offset beyond the input, 2, 1765, 0, 40, 2, false, 0, 0",
+    "huge length, 2, 0, 2147483647, 40, 2, false, 0, 0",
+    "negative clearing, 2, 0, 4, 400, -1, false, 0, 0",
+    "huge clearing, 2, 0, 4, 400, 2147483647, false, 0, 0",
+    "no channels, 0, 0, 4, 40, 2, false, 0, 0",
+    "negative channels, -2, 0, 4, 40, 2, false, 0, 0",
+    "channel count rewritten to 1, 2, 0, 882, 16000, 0, true, 8, 1",
+    "channel count rewritten to 0, 2, 0, 882, 16000, 0, true, 8, 0",
+    "stereo flag rewritten to 1, 2, 0, 882, 16000, 100, false, 12, 1",
+    "stereo flag rewritten to 2, 1, 0, 882, 16000, 100, false, 12, 2",
   })
   void badBlocksWriteNothing(
       String name, int channels, int offset, int length, int outputBytes, int frames,
-      boolean accumulate) {
+      boolean accumulate, int at, int value) {
     for (boolean fromBuffer : new boolean[] {false, true}) {
       ByteBuffer context = created(channels, 48000, false);
+      if (at == 8) context.putInt(at, value);
+      if (at == 12) context.put(at, (byte) value);
       byte[] input = pcm(new int[882]);
       byte[] output = filled(outputBytes);
       if (fromBuffer) {
@@ -194,56 +172,89 @@ public class AudioResamplerTest {
             context, input, offset, length, output, frames, accumulate);
       }
       assertArrayEquals(filled(outputBytes), output, name + (fromBuffer ? " (buffer)" : ""));
+      context.putInt(8, channels).put(12, (byte) 0);
       AudioResampler.releaseNativeResampler(context);
     }
   }
 
+  // Too small, not direct, missing, released (twice): every call is a no-op.
   @Test
-  void unusableContextsAreIgnored() {
-    ByteBuffer small = ByteBuffer.allocateDirect(8);
-    ByteBuffer heap = ByteBuffer.allocate(16);
-    for (ByteBuffer context : new ByteBuffer[] {small, heap, context(), null}) {
-      AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
+  void unusableContextsAndInputsAreIgnored() {
+    ByteBuffer released = created(2, 48000, false);
+    AudioResampler.releaseNativeResampler(released);
+    assertEquals(0L, released.getLong(0));
+    for (ByteBuffer context :
+        new ByteBuffer[] {ByteBuffer.allocateDirect(8), ByteBuffer.allocate(16), null, released}) {
+      if (context != released) AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
       AudioResampler.setVolume(context, 1, 1);
       AudioResampler.setSourceSampleRate(context, 44100);
       byte[] output = filled(20);
       AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
-      if (context != null && context.isDirect() && context.capacity() >= 16) {
-        assertNotEquals(0L, context.getLong(0));
-        AudioResampler.releaseNativeResampler(context);
-        continue;
-      }
       assertArrayEquals(filled(20), output);
       AudioResampler.releaseNativeResampler(context);
+      if (context != null && context.capacity() >= 8) assertEquals(0L, context.getLong(0));
     }
-    assertEquals(0L, small.getLong(0));
-    assertEquals(0L, heap.getLong(0));
+
+    ByteBuffer context = created(2, 48000, false);
+    byte[] output = filled(100);
+    AudioResampler.resampleFromByteBuffer(
+        context, ByteBuffer.wrap(pcm(1, 2, 3, 4)), 0, 4, output, 20, false);
+    assertArrayEquals(filled(100), output);
+    AudioResampler.releaseNativeResampler(context);
+  }
+
+  @Test
+  void tamperedContextIsRefusedUntilRestored() {
+    ByteBuffer context = created(2, 44100, false);
+    context.putInt(8, 1);
+    AudioResampler.setVolume(context, 0, 0);
+    AudioResampler.releaseNativeResampler(context);
+    assertNotEquals(0L, context.getLong(0));
+    context.putInt(8, 2);
+    byte[] output = new byte[8];
+    AudioResampler.resampleFromByteArray(context, pcm(7, 7, 7, 7), 0, 4, output, 2, false);
+    assertArrayEquals(new short[] {0, 0, 7, 7}, samples(output), "the gain was changed");
+    AudioResampler.releaseNativeResampler(context);
+    assertEquals(0L, context.getLong(0));
+  }
+
+  @Test
+  void cleanerReleasesAnInstanceNeverClosed() throws Exception {
+    AudioResampler resampler = new AudioResampler(1, 48000, false);
+    Field field = AudioResampler.class.getDeclaredField("context");
+    field.setAccessible(true);
+    ByteBuffer context = (ByteBuffer) field.get(resampler);
+    WeakReference<AudioResampler> reference = new WeakReference<>(resampler);
+    resampler = null;
+    for (int i = 0; i < 200 && context.getLong(0) != 0; i++) {
+      System.gc();
+      Thread.sleep(10);
+    }
+    assertNull(reference.get());
+    assertEquals(0L, context.getLong(0), "the instance was not released");
   }
 
   @Test
   void wrapperResamplesLikeTheRawBridge() {
-    byte[] input = new byte[2 * 2 * 441];
+    byte[] input = new byte[4 * 441];
     new java.util.Random(7).nextBytes(input);
     ByteBuffer context = created(2, 48000, false);
     AudioResampler.setSourceSampleRate(context, 44100);
     AudioResampler.setVolume(context, 0.5f, 2.0f);
     byte[] expected = new byte[4 * 480];
-    for (int block = 0; block < 3; block++) {
-      AudioResampler.resampleFromByteArray(context, input, 0, 882, expected, 480, false);
-    }
-    AudioResampler.releaseNativeResampler(context);
-
+    byte[] output = new byte[4 * 480];
     try (AudioResampler resampler = new AudioResampler(2, 48000, false)) {
       resampler.setSourceSampleRate(44100);
       resampler.setVolume(0.5f, 2.0f);
       assertEquals(480, resampler.getOutputFrameCount(441));
-      assertEquals(2, resampler.getOutputChannelCount());
-      byte[] output = new byte[4 * 480];
-      resampler.resample(input, 0, 882, output, 480, false);
-      resampler.resample(direct(input), 0, 882, output, 480, false);
-      resampler.resample(input, 0, 882, output, 480, false);
-      assertArrayEquals(expected, output);
+      for (int block = 0; block < 2; block++) {
+        AudioResampler.resampleFromByteArray(context, input, 0, 882, expected, 480, false);
+        if (block == 0) resampler.resample(input, 0, 882, output, 480, false);
+        else resampler.resample(direct(input), 0, 882, output, 480, false);
+        assertArrayEquals(expected, output, "block " + block);
+      }
     }
+    AudioResampler.releaseNativeResampler(context);
   }
 
   @Test
@@ -275,15 +286,21 @@ public class AudioResamplerTest {
 
   @Test
   void logsEachProblemOnce() throws Exception {
-    List<String> lines = runChild(LogScenario.class);
+    ChildJvm child = ChildJvm.run(LogScenario.class);
+    assertEquals(0, child.exitCode, child.stderr);
+    List<String> lines = new ArrayList<>();
+    // Without line numbers.
+    child.stderr.lines().forEach(line -> lines.add(line.replaceFirst("\\.cc:[0-9]+ ", ".cc: ")));
     assertEquals(
         List.of(
             "AudioResampler : Unsupported sample format, 8 bits, 1 channels",
             "AudioResampler : Unsupported resampling from 0 Hz to 48000 Hz: no output",
-            "native : audio_resampler_jni.cc: Resampler output of 10 bytes is too small for"
+            "native : resampler_bridge.cc: Resampler output of 10 bytes is too small for"
                 + " 2000 bytes to clear and 0 bytes to resample: nothing resampled.",
-            "native : audio_resampler_jni.cc: Resampler input of 8 samples at byte 0 exceeds"
-                + " the 4 bytes given: nothing resampled."),
+            "native : resampler_bridge.cc: Resampler input of 8 samples at byte 0 exceeds"
+                + " the 4 bytes given: nothing resampled.",
+            "native : resampler_bridge.cc: Bad resampler context: it holds 2 channels and"
+                + " stereo flag 0, its instance was made with 1 and 0: call ignored."),
         lines);
   }
 
@@ -300,16 +317,10 @@ public class AudioResamplerTest {
       AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
       AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 1000, false);
       AudioResampler.resampleFromByteBuffer(context, direct(pcm(1, 2)), 0, 8, output, 0, false);
+      context.putInt(8, 2);
+      AudioResampler.setVolume(context, 1, 1);
+      context.putInt(8, 1);
       AudioResampler.releaseNativeResampler(context);
     }
-  }
-
-  // Line numbers are left out of the returned lines.
-  private static List<String> runChild(Class<?> mainClass) throws Exception {
-    ChildJvm child = ChildJvm.run(mainClass);
-    assertEquals(0, child.exitCode, child.stderr);
-    List<String> lines = new ArrayList<>();
-    child.stderr.lines().forEach(line -> lines.add(line.replaceFirst("\\.cc:[0-9]+ ", ".cc: ")));
-    return lines;
   }
 }
