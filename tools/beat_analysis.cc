@@ -33,9 +33,15 @@ std::string TooShort(double seconds) {
          Seconds(kMinimumSeconds) + " needed)";
 }
 
+// The onset curve outlives the analyzer, so that the tracker's tables, the
+// analysis's largest part, are gone before the views are drawn.
+struct OnsetCurve {
+  std::vector<float> values;
+  int32_t per_second = 0;
+};
+
 std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
-                        const apm::AudioAnalyzer& analyzer,
-                        const BeatResult& result) {
+                        const OnsetCurve& onset, const BeatResult& result) {
   std::string error;
   if (!extras.click_path.empty() &&
       !WriteClickTrack(extras.click_path, result.path, result.beats, &error)) {
@@ -43,8 +49,7 @@ std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
   }
   if (signal == nullptr) return std::string();
   BeatView view;
-  if (!signal->MakeView(result, analyzer.detection_function(),
-                        analyzer.frames_per_second(), &view, &error)) {
+  if (!signal->MakeView(result, onset.values, onset.per_second, &view, &error)) {
     return extras.html_path + ": " + error;
   }
   if (!extras.plot_path.empty() &&
@@ -56,6 +61,26 @@ std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
     return extras.html_path + ": " + error;
   }
   return std::string();
+}
+
+// Decodes the whole file into the analyzer and the views' gatherer; the
+// frames read.
+int64_t Stream(AudioReader* reader, apm::AudioAnalyzer* analyzer,
+               BeatViewSignal* signal, const std::function<void(int)>& progress) {
+  // Where the length is unknown, the analyzer cannot tell how far it is
+  // (nor poll for Ctrl-C): the bytes read stand in.
+  const bool length_known = reader->frames() >= 0;
+  std::vector<int16_t> block(static_cast<size_t>(kBlockFrames) * reader->channels());
+  int64_t frames = 0;
+  for (int64_t got; !Interrupted() && (got = reader->Read(block.data(), kBlockFrames)) > 0;) {
+    frames += got;
+    if (!analyzer->Feed(block.data(), static_cast<int32_t>(got))) break;
+    if (signal) signal->Add(block.data(), got);
+    if (!length_known) {
+      progress(static_cast<int>(kSpectrogramPercent * reader->fraction_read()));
+    }
+  }
+  return frames;
 }
 
 }  // namespace
@@ -77,15 +102,12 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     return result;
   }
 
-  // The decoding drives the first stage; where the length is unknown, the
-  // analyzer cannot tell how far it is and the bytes read stand in.
-  const bool length_known = reader.frames() >= 0;
-  apm::AudioAnalyzer analyzer(result.sample_rate);
+  auto analyzer = std::make_unique<apm::AudioAnalyzer>(result.sample_rate);
   const auto analyzer_progress = [&](char byte) {
     progress(static_cast<unsigned char>(byte) * 100 / 99);
     return Interrupted();
   };
-  if (!analyzer.Begin(result.channels, reader.frames(), analyzer_progress)) {
+  if (!analyzer->Begin(result.channels, reader.frames(), analyzer_progress)) {
     result.error = "the analysis failed (see --verbose for its log)";
     return result;
   }
@@ -94,16 +116,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     signal = std::make_unique<BeatViewSignal>(result.sample_rate, result.channels,
                                               !extras.html_path.empty());
   }
-  std::vector<int16_t> block(static_cast<size_t>(kBlockFrames) * result.channels);
-  int64_t frames = 0;
-  // The analyzer polls for Ctrl-C only where it reports progress, which
-  // it cannot while the length is unknown.
-  for (int64_t got; !Interrupted() && (got = reader.Read(block.data(), kBlockFrames)) > 0;) {
-    frames += got;
-    if (!analyzer.Feed(block.data(), static_cast<int32_t>(got))) break;
-    if (signal) signal->Add(block.data(), got);
-    if (!length_known) progress(static_cast<int>(kSpectrogramPercent * reader.fraction_read()));
-  }
+  const int64_t frames = Stream(&reader, analyzer.get(), signal.get(), progress);
   if (Interrupted()) {
     result.interrupted = true;
     return result;
@@ -118,7 +131,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     return result;
   }
   result.warning = reader.ShortfallWarning();
-  const int32_t count = analyzer.Finish();
+  const int32_t count = analyzer->Finish();
   // A cancelled tracking stage still returns a count (of 0).
   if (Interrupted()) {
     result.interrupted = true;
@@ -128,11 +141,14 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     result.error = "the analysis failed (see --verbose for its log)";
     return result;
   }
-  result.beats.assign(analyzer.beats(), analyzer.beats() + count);
-  if (count >= 2 && std::isfinite(analyzer.bpm()) && analyzer.bpm() > 0) {
-    result.bpm = analyzer.bpm();
+  result.beats.assign(analyzer->beats(), analyzer->beats() + count);
+  if (count >= 2 && std::isfinite(analyzer->bpm()) && analyzer->bpm() > 0) {
+    result.bpm = analyzer->bpm();
   }
-  result.output_error = WriteExtras(extras, signal.get(), analyzer, result);
+  OnsetCurve onset;
+  if (signal) onset = {analyzer->detection_function(), analyzer->frames_per_second()};
+  analyzer.reset();
+  result.output_error = WriteExtras(extras, signal.get(), onset, result);
   if (Interrupted()) {
     result.interrupted = true;
     return result;
