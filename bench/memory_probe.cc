@@ -1,12 +1,16 @@
-// Native memory of one beat analysis beyond the caller's PCM buffer:
-//   memory_probe MINUTES
-// prints "minutes pcm_mib native_peak_mib". Run once per length: the peak
-// is the process's.
+// Native memory of one beat analysis, the input streamed in blocks as the
+// tool does, so no PCM is held:
+//   memory_probe MINUTES [silence]
+// prints "minutes input peak_mib kib_per_second beats", the peak being the
+// process's resident high-water mark above its size before the analysis.
+// Run once per length.
 #include <sys/resource.h>
 #include <unistd.h>
 
 #include <cstdio>
 #include <cstdlib>
+#include <algorithm>
+#include <cstring>
 
 #include "bench/pulse_track.h"
 #include "jni/apm/audio_analyzer.h"
@@ -32,21 +36,31 @@ double PeakMib() {
 }  // namespace
 
 int main(int argc, char** argv) {
-  if (argc != 2) {
-    fprintf(stderr, "usage: %s MINUTES\n", argv[0]);
+  if (argc < 2 || argc > 3 || (argc == 3 && strcmp(argv[2], "silence") != 0)) {
+    fprintf(stderr, "usage: %s MINUTES [silence]\n", argv[0]);
     return 2;
   }
   const double minutes = atof(argv[1]);
-  const std::vector<int16_t> pcm = PulseTrack(minutes * 60, 2);
+  const bool silence = argc == 3;
+  constexpr int kChannels = 2;
+  constexpr size_t kBlock = 4096;
+  PulseSource source(kChannels, !silence);
+  std::vector<int16_t> block;
+  source.Next(kBlock, &block);  // the block buffer counts as the caller's
+
   const double before = ResidentMib();
-  if (PeakMib() > before + 1) {
-    fprintf(stderr, "warning: peak before the analysis above resident size\n");
-  }
+  const auto frames = static_cast<int64_t>(minutes * 60 * kPulseRate);
   apm::AudioAnalyzer analyzer(kPulseRate);
-  const int32_t beats = analyzer.CalculateBeats(
-      reinterpret_cast<const uint8_t*>(pcm.data()),
-      static_cast<int32_t>(pcm.size() * 2), 2, [](char) { return false; });
-  printf("%g %.1f %.1f %d\n", minutes, pcm.size() * 2.0 / (1 << 20),
-         PeakMib() - before, beats);
+  analyzer.Begin(kChannels, frames, [](char) { return false; });
+  for (int64_t done = 0; done < frames; done += kBlock) {
+    const auto count = static_cast<int32_t>(
+        std::min<int64_t>(kBlock, frames - done));
+    source.Next(count, &block);
+    analyzer.Feed(block.data(), count);
+  }
+  const int32_t beats = analyzer.Finish();
+  const double peak = PeakMib() - before;
+  printf("%g %s %.1f %.2f %d\n", minutes, silence ? "silence" : "pulse", peak,
+         peak * 1024 / (minutes * 60), beats);
   return 0;
 }

@@ -5,17 +5,17 @@
 #include <cstdlib>
 
 #include "base/logging.h"
+#include "jni/apm/tempo_model.h"
 
 namespace apm {
 namespace {
 
-// Beam tables hold states in 16 bits; this value stands for "no
-// predecessor", so a model may have at most this many states.
-constexpr uint16_t kNoPredecessor = 0xFFFF;
+// A state no path reached this frame: only stored and copied, never
+// computed, so == recognises it; extended, it counts as 0.
+constexpr double kUnreached = -100000.0;
 
-// The tracking pass takes frames modulo every lag, reads the second and
-// third lag for the grid step and takes beam_width states out of every
-// frame; the beam tables need states that fit in 16 bits.
+// The pass takes frames modulo every lag, reads the grid step off the
+// second and third lag, and needs beam_width states in 16 bits each.
 bool UsableModel(const ApmConfig& config, double min_lag, double max_lag) {
   double states = 0.0;
   if (min_lag >= 1.0 && max_lag >= min_lag && max_lag <= kNoPredecessor) {
@@ -88,6 +88,21 @@ bool Apm::TrimInput(const std::vector<float>& input,
   return true;
 }
 
+int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase) {
+  return WrappedPhaseOffset(t % lag, lag, phase);
+}
+
+double MedianTempo(const std::vector<double>& beat_times) {
+  if (beat_times.size() < 2) return 0.0;
+  std::vector<double> intervals(beat_times.size() - 1);
+  for (size_t i = 0; i < intervals.size(); ++i) {
+    intervals[i] = beat_times[i + 1] - beat_times[i];
+  }
+  const auto middle = intervals.begin() + (beat_times.size() - 1) / 2;
+  std::nth_element(intervals.begin(), middle, intervals.end());
+  return 60.0 / *middle;
+}
+
 bool Apm::SetUpStates() {
   const double rate = frames_per_second_;
   // Periods in whole frames, halves rounded away from zero.
@@ -107,32 +122,17 @@ bool Apm::SetUpStates() {
     lag_ms_[i] = lag_frames_[i] * 1000.0 / rate;
   }
   const double delta_pd_ms = lag_ms_[2] - lag_ms_[1];
-
-  const double sigma = config_.transition_sigma_ms;
-  const auto gaussian = [delta_pd_ms, sigma](int32_t d) {
-    const double x = d * delta_pd_ms;
-    return std::exp(x * x / (sigma * (sigma * -2.0)));
-  };
-  phase_deviation_score_.resize(config_.phase_table_size);
-  for (int32_t d = 0; d < config_.phase_table_size; ++d) {
-    phase_deviation_score_[d] =
-        std::log(config_.phase_deviation_weight * gaussian(d) + kEpsilon);
-  }
-  period_change_score_.resize(config_.period_table_size);
-  for (int32_t d = 0; d < config_.period_table_size; ++d) {
-    period_change_score_[d] =
-        std::log(config_.period_change_weight * gaussian(d) + kEpsilon);
-  }
-
-  // A Gaussian in the decimal logarithm of the period.
-  tempo_prior_.assign(lag_count_, 0.0);
-  for (int32_t i = 0; config_.use_tempo_prior && i < lag_count_; ++i) {
-    const double z = std::log10(lag_frames_[i] * 1000.0 /
-                                (config_.tempo_prior_center_ms * rate)) *
-                     (1.0 / config_.tempo_prior_width);
-    tempo_prior_[i] = config_.tempo_prior_weight *
-                      std::log(kEpsilon + std::exp(z * (z * -0.5)));
-  }
+  phase_deviation_score_ =
+      TransitionScores(config_.phase_table_size, config_.phase_deviation_weight,
+                       delta_pd_ms, config_.transition_sigma_ms);
+  period_change_score_ =
+      TransitionScores(config_.period_table_size, config_.period_change_weight,
+                       delta_pd_ms, config_.transition_sigma_ms);
+  tempo_prior_ =
+      config_.use_tempo_prior
+          ? TempoPrior(lag_frames_, rate, config_.tempo_prior_center_ms,
+                       config_.tempo_prior_width, config_.tempo_prior_weight)
+          : std::vector<double>(lag_count_, 0.0);
 
   lag_first_state_.resize(lag_count_);
   state_lag_.clear();
@@ -159,19 +159,24 @@ bool Apm::SetUpStates() {
   LOG(INFO) << "state count " << state_count_;
   LOG(INFO) << "value count " << value_count_;
   LOG(INFO) << "apmtime count " << apmtime_count_;
+  SetUpSearch();
+  return true;
+}
 
-  values_.Reset(value_count_, state_count_, kImpossible);
-  observation_.assign(state_count_, kImpossible);
-  comb_rows_ = apmtime_count_ > max_lag_ ? max_lag_ + 1 : apmtime_count_;
-  comb_.Reset(comb_rows_, lag_count_, kImpossible);
-  beam_predecessors_.Reset(time_count_ + 1, config_.beam_width, 0);
-  beam_states_.Reset(time_count_ + 1, config_.beam_width, 0);
+// The search's tables and scratch, sized once for the model.
+void Apm::SetUpSearch() {
+  values_.Reset(value_count_, state_count_, kUnreached);
+  observation_.assign(state_count_, kUnreached);
+  comb_.Reset(lag_frames_,
+              apmtime_count_ > max_lag_ ? max_lag_ + 1 : apmtime_count_,
+              config_.comb_input_weight, config_.comb_start_factor);
+  history_.Reset(config_.beam_width, time_count_, config_.plain_search);
   predecessor_.assign(state_count_, -1);
-  path_.assign(time_count_, 0);
   // The first frame extends the phase-0 state of every lag.
   beam_.assign(std::max(config_.beam_width, lag_count_), 0);
   std::copy(lag_first_state_.begin(), lag_first_state_.end(), beam_.begin());
 
+  // Scratch of the per-frame steps.
   live_stamp_.assign(state_count_, -1);
   candidates_.reserve(state_count_);
   candidate_lag_.assign(state_count_, 0);
@@ -192,44 +197,20 @@ bool Apm::SetUpStates() {
   previous_sibling_.assign(state_count_, -1);
   linked_parent_.assign(state_count_, -1);
   is_parent_.assign(state_count_, 0);
-  return true;
-}
-
-// Comb filter of every lag: the product of detection values one period
-// apart, mixed with the filter's own output one period earlier.
-void Apm::Observe(int32_t t) {
-  const double weight = config_.comb_input_weight;
-  const float x = detection_[t];
-  double* out = comb_.row(t % comb_rows_);
-  for (int32_t i = 0; i < lag_count_; ++i) {
-    const int32_t back = t - lag_frames_[i];
-    float product = back >= 0
-                        ? detection_[back] * x
-                        : static_cast<float>(config_.comb_start_factor * x);
-    if (weight < 1.0) {
-      const float previous = static_cast<float>(
-          back >= 0 ? std::exp(comb_.row(back % comb_rows_)[i])
-                    : config_.comb_start_factor);
-      product =
-          static_cast<float>(previous * (1.0 - weight) + weight * product);
-    }
-    out[i] = std::log(product + kEpsilon);
-  }
 }
 
 // Candidates: the on-beat state of every lag (lag index order), then the
 // states whose best predecessor has left the beam.
 void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
-  const double* comb = comb_.row(t % comb_rows_);
   candidates_.clear();
   for (int32_t i = 0; i < lag_count_; ++i) {
     if (t > 0 && ++frame_phase_[i] == lag_frames_[i]) frame_phase_[i] = 0;
     candidates_.push_back(lag_first_state_[i] + frame_phase_[i]);
-    observation_[candidates_.back()] = comb[i];
+    observation_[candidates_.back()] = comb_out_[i];
   }
   const double* values = values_.row(cur);
   for (int32_t k = 0; k < active; ++k) {
-    if (values[beam_[k]] != kImpossible) live_stamp_[beam_[k]] = t;
+    if (values[beam_[k]] != kUnreached) live_stamp_[beam_[k]] = t;
   }
   size_t kept = 0;
   for (const int32_t parent : parents_) {
@@ -247,10 +228,11 @@ void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
   }
   parents_.resize(kept);
 
+  // The candidates are scored afresh.
   double* next_values = values_.row(next);
   if (next != cur) CatchUpRow(t, values, next_values);
   changed_[t % value_count_] = candidates_;
-  for (int32_t c : candidates_) next_values[c] = kImpossible;
+  for (int32_t c : candidates_) next_values[c] = kUnreached;
 }
 
 // Row next is behind row cur by the candidates of the frames since it was
@@ -261,7 +243,9 @@ void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
   for (int32_t back = 1; back <= frames; ++back) {
     behind += changed_[(t - back) % value_count_].size();
   }
-  if (behind * 8 >= static_cast<size_t>(state_count_)) {
+  // A scattered copy costs several times a streamed one per state: from an
+  // eighth of the row on, copying the whole row is the cheaper.
+  if (config_.plain_search || behind * 8 >= static_cast<size_t>(state_count_)) {
     std::copy_n(values, state_count_, next_values);
     return;
   }
@@ -270,6 +254,22 @@ void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
       next_values[s] = values[s];
     }
   }
+}
+
+// The first state with the largest value after the last frame.
+int32_t Apm::BestFinalState() const {
+  // Below any value a row holds, kUnreached included.
+  constexpr double kBelowEveryValue = -10000000.0;
+  const double* last = values_.row(time_count_ % value_count_);
+  int32_t state = 0;
+  double best = kBelowEveryValue;
+  for (int32_t s = 0; s < state_count_; ++s) {
+    if (last[s] > best) {
+      best = last[s];
+      state = s;
+    }
+  }
+  return state;
 }
 
 void Apm::Run(std::function<bool(float)> progress) {
@@ -283,44 +283,50 @@ void Apm::Run(std::function<bool(float)> progress) {
     }
     const int32_t cur = t % value_count_;
     const int32_t next = (t + 1) % value_count_;
-    Observe(t);
+    comb_out_ = comb_.Filter(detection_, t);
     PrepareStep(t, cur, next, active);
-    Transition(t, cur, next, active);
-    SelectBeam(t, next);
+    Transition(cur, next, active);
+    SelectBeam(next);
     active = config_.beam_width;
   }
   Backtrack();
   PlaceBeats();
 }
 
-void Apm::SelectBeam(int32_t t, int32_t next) {
-  selector_.Reselect(values_.row(next), state_count_, candidates_.data(),
-                     static_cast<int32_t>(candidates_.size()),
-                     config_.beam_width, beam_.data());
-  uint16_t* states = beam_states_.row(t + 1);
-  uint16_t* predecessors = beam_predecessors_.row(t + 1);
-  for (int32_t k = 0; k < config_.beam_width; ++k) {
-    const int32_t s = beam_[k];
-    states[k] = static_cast<uint16_t>(s);
-    predecessors[k] = predecessor_[s] == -1
-                          ? kNoPredecessor
-                          : static_cast<uint16_t>(predecessor_[s]);
+// The heap alone is the reference that the shortcuts match.
+void Apm::SelectBeam(int32_t next) {
+  if (config_.plain_search) {
+    selector_.SelectByHeap(values_.row(next), state_count_, config_.beam_width,
+                           beam_.data());
+  } else {
+    selector_.Reselect(values_.row(next), state_count_, candidates_.data(),
+                       static_cast<int32_t>(candidates_.size()),
+                       config_.beam_width, beam_.data());
   }
+  history_.Append(beam_.data(), predecessor_.data());
+}
+
+// The state's wrapped phase offset at the current frame: frames since its
+// nearest beat, negative before it.
+int32_t Apm::Offset(int32_t state) const {
+  const int32_t lag = state_lag_[state];
+  return WrappedPhaseOffset(frame_phase_[lag - min_lag_], lag,
+                            state_phase_[state]);
 }
 
 // The best of all beam entries for every candidate; for the on-beat states
 // through the grouped scoring when it applies.
-void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
+void Apm::Transition(int32_t cur, int32_t next, int32_t active) {
   // With a single value row, entries read later see this frame's updates,
   // which only the pass in beam order reproduces.
-  if (next == cur) {
+  if (next == cur || config_.plain_search) {
     TransitionOneByOne(cur, next, active);
   } else {
     const double* values = values_.row(cur);
     for (int32_t k = 0; k < active; ++k) {
       const int32_t f = beam_[k];
       entry_base_[k] =
-          config_.beat_bonus + (values[f] == kImpossible ? 0.0 : values[f]);
+          config_.beat_bonus + (values[f] == kUnreached ? 0.0 : values[f]);
       entry_lag_[k] = state_lag_[f] - min_lag_;
       entry_offset_[k] = Offset(f);
     }
@@ -328,9 +334,8 @@ void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
                               entry_offset_.data(), active};
     double* next_values = values_.row(next);
     size_t first = 0;
-    if (transition_.ScoreOnBeat(entries, comb_.row(t % comb_rows_),
-                                tempo_prior_.data(), best_.data(),
-                                best_from_.data())) {
+    if (transition_.ScoreOnBeat(entries, comb_out_, tempo_prior_.data(),
+                                best_.data(), best_from_.data())) {
       for (int32_t j = 0; j < lag_count_; ++j) {
         const int32_t c = candidates_[j];
         if (best_[j] > next_values[c]) {
@@ -350,96 +355,9 @@ void Apm::Transition(int32_t t, int32_t cur, int32_t next, int32_t active) {
       if (from != -1) predecessor_[c] = beam_[from];
     }
   }
+  // Keeps the orphan lists in step with the new predecessors.
   for (int32_t c : candidates_) {
     if (predecessor_[c] != linked_parent_[c]) Relink(c);
-  }
-}
-
-// The state's wrapped phase offset at the current frame.
-int32_t Apm::Offset(int32_t state) const {
-  const int32_t lag = state_lag_[state];
-  return WrappedPhaseOffset(frame_phase_[lag - min_lag_], lag,
-                            state_phase_[state]);
-}
-
-// The first state with the largest value after the last frame.
-int32_t Apm::BestFinalState() const {
-  const double* last = values_.row(time_count_ % value_count_);
-  int32_t state = 0;
-  double best = -10000000.0;
-  for (int32_t s = 0; s < state_count_; ++s) {
-    if (last[s] > best) {
-      best = last[s];
-      state = s;
-    }
-  }
-  return state;
-}
-
-void Apm::PlaceBeats() {
-  beat_times_ =
-      BeatFramesToSeconds(PlaceBeatFrames(path_, state_lag_, state_phase_,
-                                          config_.min_beat_spacing),
-                          leading_trimmed_, frames_per_second_);
-  bpm_ = MedianTempo(beat_times_);
-}
-
-// Row t of the beam tables holds the beam after frame t - 1, so it names
-// the predecessor of the path's state at that frame.
-void Apm::Backtrack() {
-  int32_t s = BestFinalState();
-  const int32_t width = config_.beam_width;
-  for (int32_t t = time_count_; t >= 1; --t) {
-    const uint16_t* states = beam_states_.row(t);
-    int32_t k = 0;
-    while (k < width && states[k] != s) ++k;
-    if (k == width) {
-      LOG(ERROR) << "Broken state link " << t << " of " << time_count_;
-      // Go on from the best state of the beam, which was popped last.
-      k = width - 1;
-      if (s == -1) s = states[k];
-    }
-    path_[t - 1] = s;
-    const uint16_t predecessor = beam_predecessors_.row(t)[k];
-    s = predecessor == kNoPredecessor ? -1 : predecessor;
-  }
-}
-
-// Scores every candidate from every beam entry in turn. The per-candidate
-// and per-entry terms are looked up once; the sum keeps its grouping.
-void Apm::TransitionOneByOne(int32_t cur, int32_t next, int32_t active) {
-  const int32_t count = static_cast<int32_t>(candidates_.size());
-  for (int32_t j = 0; j < count; ++j) {
-    const int32_t c = candidates_[j];
-    candidate_lag_[j] = state_lag_[c];
-    candidate_offset_[j] = Offset(c);
-    candidate_observation_[j] = observation_[c];
-    candidate_prior_[j] = tempo_prior_[state_lag_[c] - min_lag_];
-  }
-  const int32_t last_period = config_.period_table_size - 1;
-  const int32_t last_phase = config_.phase_table_size - 1;
-  const double* values = values_.row(cur);
-  double* next_values = values_.row(next);
-  for (int32_t k = 0; k < active; ++k) {
-    const int32_t f = beam_[k];
-    const double base =
-        config_.beat_bonus + (values[f] == kImpossible ? 0.0 : values[f]);
-    const int32_t lag = state_lag_[f];
-    const int32_t offset = Offset(f);
-    for (int32_t j = 0; j < count; ++j) {
-      const double period = period_change_score_[std::min(
-          std::abs(candidate_lag_[j] - lag), last_period)];
-      const double phase = phase_deviation_score_[std::min(
-          std::abs(offset - candidate_offset_[j]), last_phase)];
-      const double score =
-          base + (((candidate_observation_[j] + period) + phase) +
-                  candidate_prior_[j]);
-      const int32_t c = candidates_[j];
-      if (score > next_values[c]) {
-        next_values[c] = score;
-        predecessor_[c] = f;
-      }
-    }
   }
 }
 
@@ -466,16 +384,76 @@ void Apm::Relink(int32_t state) {
   }
 }
 
-int32_t WrappedOffset(int32_t t, int32_t lag, int32_t phase) {
-  return WrappedPhaseOffset(t % lag, lag, phase);
+// Row t of the beam history holds the beam after frame t - 1, so it names
+// the predecessor of the path's state at that frame. Rows up to the last
+// merge point were followed when the merge was found.
+void Apm::Backtrack() {
+  int32_t s = BestFinalState();
+  for (int32_t t = time_count_; t >= 1; --t) {
+    const bool linked = t > history_.decided() ? history_.Follow(t, &s)
+                                               : !history_.WasBroken(t);
+    // A broken link goes on from the best state of the beam.
+    if (!linked) {
+      LOG(ERROR) << "Broken state link " << t << " of " << time_count_;
+    }
+  }
+}
+
+void Apm::PlaceBeats() {
+  beat_times_ =
+      BeatFramesToSeconds(PlaceBeatFrames(history_.path(), state_lag_,
+                                          state_phase_,
+                                          config_.min_beat_spacing),
+                          leading_trimmed_, frames_per_second_);
+  bpm_ = MedianTempo(beat_times_);
+}
+
+// Scores every candidate from every beam entry in turn. The per-candidate
+// and per-entry terms are looked up once; the sum keeps its grouping.
+void Apm::TransitionOneByOne(int32_t cur, int32_t next, int32_t active) {
+  const int32_t count = static_cast<int32_t>(candidates_.size());
+  for (int32_t j = 0; j < count; ++j) {
+    const int32_t c = candidates_[j];
+    candidate_lag_[j] = state_lag_[c];
+    candidate_offset_[j] = Offset(c);
+    candidate_observation_[j] = observation_[c];
+    candidate_prior_[j] = tempo_prior_[state_lag_[c] - min_lag_];
+  }
+  const int32_t last_period = config_.period_table_size - 1;
+  const int32_t last_phase = config_.phase_table_size - 1;
+  const double* values = values_.row(cur);
+  double* next_values = values_.row(next);
+  for (int32_t k = 0; k < active; ++k) {
+    const int32_t f = beam_[k];
+    const double base =
+        config_.beat_bonus + (values[f] == kUnreached ? 0.0 : values[f]);
+    const int32_t lag = state_lag_[f];
+    const int32_t offset = Offset(f);
+    for (int32_t j = 0; j < count; ++j) {
+      const double period = period_change_score_[std::min(
+          std::abs(candidate_lag_[j] - lag), last_period)];
+      const double phase = phase_deviation_score_[std::min(
+          std::abs(offset - candidate_offset_[j]), last_phase)];
+      const double score =
+          base + (((candidate_observation_[j] + period) + phase) +
+                  candidate_prior_[j]);
+      const int32_t c = candidates_[j];
+      if (score > next_values[c]) {
+        next_values[c] = score;
+        predecessor_[c] = f;
+      }
+    }
+  }
 }
 
 std::vector<int32_t> PlaceBeatFrames(const std::vector<int32_t>& path,
                                      const std::vector<int32_t>& state_lag,
                                      const std::vector<int32_t>& state_phase,
                                      double min_beat_spacing) {
+  // Far enough back that the first candidate is always spaced from it.
+  constexpr int32_t kNoBeatYet = -1000000;
   std::vector<int32_t> frames;
-  int32_t last = -1000000;
+  int32_t last = kNoBeatYet;
   int32_t previous_lag = -1;
   int32_t previous_phase = -1;
   for (int32_t t = 0; t < static_cast<int32_t>(path.size()); ++t) {
@@ -503,17 +481,6 @@ std::vector<double> BeatFramesToSeconds(const std::vector<int32_t>& frames,
         (static_cast<double>(frames[i]) + leading_trimmed) * seconds_per_frame;
   }
   return times;
-}
-
-double MedianTempo(const std::vector<double>& beat_times) {
-  if (beat_times.size() < 2) return 0.0;
-  std::vector<double> intervals(beat_times.size() - 1);
-  for (size_t i = 0; i < intervals.size(); ++i) {
-    intervals[i] = beat_times[i + 1] - beat_times[i];
-  }
-  const auto middle = intervals.begin() + (beat_times.size() - 1) / 2;
-  std::nth_element(intervals.begin(), middle, intervals.end());
-  return 60.0 / *middle;
 }
 
 }  // namespace apm

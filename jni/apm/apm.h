@@ -13,7 +13,9 @@
 #include <vector>
 
 #include "jni/apm/apm_transition.h"
+#include "jni/apm/beam_history.h"
 #include "jni/apm/beam_selector.h"
+#include "jni/apm/comb_bank.h"
 
 namespace apm {
 
@@ -43,6 +45,10 @@ struct ApmConfig {
   // Least distance between two beats, as a fraction of the current period.
   double min_beat_spacing = 0.75;
   double beat_bonus = 2.0;
+  // Scores every candidate from every beam entry, selects the beam through
+  // the heap alone and keeps every beam row: the reference that the fast
+  // paths match bit for bit.
+  bool plain_search = false;
 };
 
 // Signed distance in frames from frame t to the nearest beat of a state with
@@ -93,32 +99,6 @@ class Apm {
   std::vector<double> beat_times() const { return beat_times_; }
   double bpm() const { return bpm_; }
 
-  // The model, for inspection.
-  int32_t leading_trimmed() const { return leading_trimmed_; }
-  int32_t trailing_trimmed() const { return trailing_trimmed_; }
-  const std::vector<float>& detection() const { return detection_; }
-  int32_t min_lag() const { return min_lag_; }
-  int32_t max_lag() const { return max_lag_; }
-  int32_t lag_count() const { return lag_count_; }
-  int32_t time_count() const { return time_count_; }
-  int32_t state_count() const { return state_count_; }
-  int32_t value_count() const { return value_count_; }
-  int32_t apmtime_count() const { return apmtime_count_; }
-  const std::vector<double>& lag_ms() const { return lag_ms_; }
-  const std::vector<int32_t>& lag_first_state() const {
-    return lag_first_state_;
-  }
-  const std::vector<int32_t>& state_lag() const { return state_lag_; }
-  const std::vector<int32_t>& state_phase() const { return state_phase_; }
-  const std::vector<double>& tempo_prior() const { return tempo_prior_; }
-  const std::vector<double>& phase_deviation_score() const {
-    return phase_deviation_score_;
-  }
-  const std::vector<double>& period_change_score() const {
-    return period_change_score_;
-  }
-  const std::vector<int32_t>& path() const { return path_; }
-
  private:
   // Row-major 2-D array.
   template <typename T>
@@ -139,14 +119,14 @@ class Apm {
 
   bool TrimInput(const std::vector<float>& input, int32_t frames_per_second);
   bool SetUpStates();
-  void Observe(int32_t t);
+  void SetUpSearch();
   void PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active);
   void CatchUpRow(int32_t t, const double* values, double* next_values);
-  void Transition(int32_t t, int32_t cur, int32_t next, int32_t active);
+  void Transition(int32_t cur, int32_t next, int32_t active);
   void TransitionOneByOne(int32_t cur, int32_t next, int32_t active);
   int32_t Offset(int32_t state) const;
   void Relink(int32_t state);
-  void SelectBeam(int32_t t, int32_t next);
+  void SelectBeam(int32_t next);
   void Backtrack();
   int32_t BestFinalState() const;
   void PlaceBeats();
@@ -162,23 +142,17 @@ class Apm {
   int32_t max_lag_ = 0;
   // The on-beat state of every lag, by lag index, then the orphans.
   std::vector<int32_t> candidates_;
-  static constexpr double kImpossible = -100000.0;
-  static constexpr double kEpsilon = 1e-5;
   int32_t frames_per_second_ = 0;
   std::vector<float> detection_;
 
-  // Only frame t - lag is ever read back, so the ring is no deeper than
-  // the longest lag needs.
-  Table<double> comb_;
-  int32_t comb_rows_ = 0;
+  CombBank comb_;
+  // This frame's comb outputs, by lag index.
+  const double* comb_out_ = nullptr;
   // Ring of value_count_ rows.
   Table<double> values_;
-  // Beam tables grow with the input, so states are kept in 16 bits.
-  Table<uint16_t> beam_predecessors_;
   std::vector<int32_t> predecessor_;
   std::vector<double> observation_;
-  Table<uint16_t> beam_states_;
-  std::vector<int32_t> path_;
+  BeamHistory history_;
   std::vector<int32_t> beam_;
 
   std::vector<int32_t> lag_first_state_;
@@ -222,9 +196,6 @@ class Apm {
   std::vector<int32_t> linked_parent_;
   std::vector<int32_t> parents_;
   std::vector<char> is_parent_;
-
-  // Tests compare the working tables with a plain implementation's.
-  friend class ApmPeer;
 };
 
 }  // namespace apm

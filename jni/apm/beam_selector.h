@@ -42,6 +42,11 @@ class BeamSelector {
   void Finish(const double* values, int32_t count, int32_t width,
               int32_t* beam);
 
+  // Ranks kept below the beam. Each frame rescores the on-beat state of
+  // every lag and the orphans, and a rescored state that falls below the
+  // floor leaves the ranking; the spares make up for those losses on most
+  // frames (when they do not, a full Select follows) while keeping the
+  // ranking short to merge.
   static constexpr size_t kSpareRanks = 16;
 
   std::vector<BeamEntry> heap_;

@@ -1,0 +1,119 @@
+#include "jni/apm/beam_history.h"
+
+#include <algorithm>
+
+namespace apm {
+namespace {
+
+// Frames between merge checks at least; a check walks back over the kept
+// rows, so with a long undecided stretch they come further apart.
+constexpr int32_t kCheckInterval = 256;
+
+}  // namespace
+
+void BeamHistory::Reset(int32_t width, int32_t frame_count,
+                        bool keep_every_row) {
+  width_ = width;
+  keep_every_row_ = keep_every_row;
+  last_row_ = 0;
+  decided_ = 0;
+  last_check_ = 0;
+  states_.clear();
+  predecessors_.clear();
+  path_.assign(frame_count, 0);
+  broken_.clear();
+  position_.assign(static_cast<size_t>(kNoPredecessor) + 1, -1);
+}
+
+const uint16_t* BeamHistory::states(int32_t t) const {
+  return states_.data() + static_cast<size_t>(t - decided_ - 1) * width_;
+}
+
+const uint16_t* BeamHistory::predecessors(int32_t t) const {
+  return predecessors_.data() + static_cast<size_t>(t - decided_ - 1) * width_;
+}
+
+void BeamHistory::Append(const int32_t* beam, const int32_t* predecessor) {
+  for (int32_t k = 0; k < width_; ++k) {
+    const int32_t s = beam[k];
+    states_.push_back(static_cast<uint16_t>(s));
+    predecessors_.push_back(predecessor[s] == -1
+                                ? kNoPredecessor
+                                : static_cast<uint16_t>(predecessor[s]));
+  }
+  ++last_row_;
+  const int32_t undecided = last_row_ - decided_;
+  if (!keep_every_row_ &&
+      last_row_ - last_check_ >= std::max(kCheckInterval, undecided / 2)) {
+    last_check_ = last_row_;
+    CheckForMerge();
+  }
+}
+
+bool BeamHistory::Follow(int32_t t, int32_t* state) {
+  const uint16_t* row = states(t);
+  int32_t s = *state;
+  int32_t k = 0;
+  while (k < width_ && row[k] != s) ++k;
+  const bool found = k < width_;
+  if (!found) {
+    k = width_ - 1;
+    if (s == -1) s = row[k];
+  }
+  path_[t - 1] = s;
+  const uint16_t predecessor = predecessors(t)[k];
+  *state = predecessor == kNoPredecessor ? -1 : predecessor;
+  return found;
+}
+
+bool BeamHistory::WasBroken(int32_t t) const {
+  return std::binary_search(broken_.begin(), broken_.end(), t);
+}
+
+int32_t BeamHistory::StepBack(int32_t t, int32_t s) const {
+  const int32_t k = s == -1 || position_[s] == -1 ? width_ - 1 : position_[s];
+  const uint16_t predecessor = predecessors(t)[k];
+  return predecessor == kNoPredecessor ? -1 : predecessor;
+}
+
+// Whatever state the final backtrack enters the newest row in, it leaves
+// it in the predecessor of one of the row's entries; those ways back are
+// followed down until they meet.
+void BeamHistory::CheckForMerge() {
+  ways_.clear();
+  const uint16_t* newest = predecessors(last_row_);
+  for (int32_t k = 0; k < width_; ++k) {
+    ways_.push_back(newest[k] == kNoPredecessor ? -1 : newest[k]);
+  }
+  for (int32_t t = last_row_ - 1; t > decided_; --t) {
+    std::sort(ways_.begin(), ways_.end());
+    ways_.erase(std::unique(ways_.begin(), ways_.end()), ways_.end());
+    if (ways_.size() == 1) {
+      Settle(t, ways_[0]);
+      return;
+    }
+    const uint16_t* row = states(t);
+    // Backwards, so that a state found twice keeps its first position.
+    for (int32_t k = width_ - 1; k >= 0; --k) position_[row[k]] = k;
+    next_ways_.clear();
+    for (const int32_t s : ways_) next_ways_.push_back(StepBack(t, s));
+    for (int32_t k = 0; k < width_; ++k) position_[row[k]] = -1;
+    ways_.swap(next_ways_);
+  }
+}
+
+// Backtracks rows merge_row down to the last decided one, entering in
+// state, and drops them.
+void BeamHistory::Settle(int32_t merge_row, int32_t state) {
+  const size_t first_new = broken_.size();
+  for (int32_t t = merge_row; t > decided_; --t) {
+    if (!Follow(t, &state)) broken_.push_back(t);
+  }
+  std::reverse(broken_.begin() + first_new, broken_.end());
+  const size_t dropped = static_cast<size_t>(merge_row - decided_) * width_;
+  states_.erase(states_.begin(), states_.begin() + dropped);
+  predecessors_.erase(predecessors_.begin(), predecessors_.begin() + dropped);
+  decided_ = merge_row;
+}
+
+}  // namespace apm

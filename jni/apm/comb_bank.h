@@ -1,0 +1,39 @@
+// One comb filter per lag: how strongly the detection function repeats at
+// that period, as the log of the product of values one period apart, mixed
+// with the filter's own output one period earlier.
+#ifndef CLIPWEAVER_JNI_APM_COMB_BANK_H_
+#define CLIPWEAVER_JNI_APM_COMB_BANK_H_
+
+#include <cstddef>
+#include <cstdint>
+#include <vector>
+
+namespace apm {
+
+class CombBank {
+ public:
+  // input_weight of 1 or more leaves the filters without feedback;
+  // start_factor stands for the input and the output one period before
+  // the first frame. The outputs of ring_rows frames are kept; reading one
+  // period back needs the longest lag plus one.
+  void Reset(const std::vector<int32_t>& lag_frames, int32_t ring_rows,
+             double input_weight, double start_factor);
+
+  // Filters frame t (0, 1, ... in turn) and returns every lag's output.
+  const double* Filter(const std::vector<float>& detection, int32_t t);
+
+ private:
+  double* row(int32_t t) {
+    return outputs_.data() + static_cast<size_t>(t % rows_) * lag_frames_.size();
+  }
+
+  std::vector<int32_t> lag_frames_;
+  double input_weight_ = 0.0;
+  double start_factor_ = 0.0;
+  int32_t rows_ = 0;
+  std::vector<double> outputs_;
+};
+
+}  // namespace apm
+
+#endif  // CLIPWEAVER_JNI_APM_COMB_BANK_H_
