@@ -3,6 +3,7 @@
 #include <cmath>
 #include <cstdio>
 #include <memory>
+#include <utility>
 
 #include "jni/apm/audio_analyzer.h"
 #include "tools/audio_file.h"
@@ -41,7 +42,7 @@ struct OnsetCurve {
 };
 
 std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
-                        const OnsetCurve& onset, const BeatResult& result) {
+                        OnsetCurve onset, const BeatResult& result) {
   std::string error;
   if (!extras.click_path.empty() &&
       !WriteClickTrack(extras.click_path, result.path, result.beats, &error)) {
@@ -49,7 +50,7 @@ std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
   }
   if (signal == nullptr) return std::string();
   BeatView view;
-  if (!signal->MakeView(result, onset.values, onset.per_second, &view, &error)) {
+  if (!signal->MakeView(result, std::move(onset.values), onset.per_second, &view, &error)) {
     return extras.html_path + ": " + error;
   }
   if (!extras.plot_path.empty() &&
@@ -148,7 +149,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   OnsetCurve onset;
   if (signal) onset = {analyzer->detection_function(), analyzer->frames_per_second()};
   analyzer.reset();
-  result.output_error = WriteExtras(extras, signal.get(), onset, result);
+  result.output_error = WriteExtras(extras, signal.get(), std::move(onset), result);
   if (Interrupted()) {
     result.interrupted = true;
     return result;

@@ -1,6 +1,7 @@
 #include "tools/beat_view.h"
 
 #include <cmath>
+#include <utility>
 
 namespace cwtool {
 namespace {
@@ -26,7 +27,7 @@ void BeatViewSignal::Add(const int16_t* frames, int64_t count) {
   if (encoder_ && !encoder_->Add(frames, count, &encoder_error_)) encoder_.reset();
 }
 
-bool BeatViewSignal::MakeView(const BeatResult& result, const std::vector<float>& onset,
+bool BeatViewSignal::MakeView(const BeatResult& result, std::vector<float> onset,
                               int32_t onset_per_second, BeatView* view,
                               std::string* error) {
   view->file = result.path;
@@ -39,10 +40,9 @@ bool BeatViewSignal::MakeView(const BeatResult& result, const std::vector<float>
   view->tracker_tempo = result.bpm;
   view->beats = result.beats;
   view->envelope_per_second = kEnvelopePerSecond;
-  view->envelope_low = envelope_.low();
-  view->envelope_high = envelope_.high();
+  envelope_.Take(&view->envelope_low, &view->envelope_high);
   view->onset_per_second = onset_per_second;
-  view->onset = onset;
+  view->onset = std::move(onset);
   if (!encoder_error_.empty()) {
     *error = encoder_error_;
     return false;

@@ -45,8 +45,9 @@ class BeatViewSignal {
 
   // Interleaved 16-bit frames, in order, in blocks of any size.
   void Add(const int16_t* frames, int64_t count);
-  // The view of the analysed file; on failure *error says why.
-  bool MakeView(const BeatResult& result, const std::vector<float>& onset,
+  // The view of the analysed file, once: the signal's data move into it.
+  // On failure *error says why.
+  bool MakeView(const BeatResult& result, std::vector<float> onset,
                 int32_t onset_per_second, BeatView* view, std::string* error);
 
  private:

@@ -1,6 +1,7 @@
 #include "tools/wave_envelope.h"
 
 #include <algorithm>
+#include <utility>
 
 namespace cwtool {
 
@@ -25,6 +26,13 @@ void WaveEnvelope::Add(const int16_t* frames, int64_t count) {
     low_[bucket] = std::min(low_[bucket], v);
     high_[bucket] = std::max(high_[bucket], v);
   }
+}
+
+void WaveEnvelope::Take(std::vector<float>* low, std::vector<float>* high) {
+  *low = std::move(low_);
+  *high = std::move(high_);
+  low_.clear();
+  high_.clear();
 }
 
 }  // namespace cwtool

@@ -17,6 +17,9 @@ class WaveEnvelope {
   // The buckets so far, the last one possibly partial.
   const std::vector<float>& low() const { return low_; }
   const std::vector<float>& high() const { return high_; }
+  // Hands the buckets over, leaving the envelope empty: long tracks have
+  // megabytes of them.
+  void Take(std::vector<float>* low, std::vector<float>* high);
 
  private:
   int32_t sample_rate_;
