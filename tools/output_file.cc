@@ -70,6 +70,8 @@ std::string WriteErrorText(int errno_value) {
       return "cannot write: a part of the path is not a directory";
     case EISDIR:
       return "cannot write: is a directory";
+    case ENAMETOOLONG:
+      return "cannot write: name too long";
     default:
       return "cannot write: input/output error";
   }
