@@ -89,7 +89,8 @@ bool OutputFile::Create(const std::string& path, std::string* error) {
     *error = WriteErrorText(EISDIR);
     return false;
   }
-  std::string pattern = directory + "." + name + ".XXXXXX";
+  // Shortened so that a name at the file system's limit still gets one.
+  std::string pattern = directory + "." + name.substr(0, 200) + ".XXXXXX";
   fd_ = mkostemp(&pattern[0], O_CLOEXEC);
   if (fd_ < 0) {
     *error = WriteErrorText(errno);
