@@ -8,7 +8,6 @@
 #include <cctype>
 #include <cerrno>
 #include <cstdio>
-#include <cstring>
 #include <limits>
 #include <mutex>
 
