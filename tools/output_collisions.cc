@@ -16,12 +16,14 @@ std::string Identity(const std::string& path) {
   if (stat(path.c_str(), &status) == 0) {
     return "inode " + std::to_string(status.st_dev) + ":" + std::to_string(status.st_ino);
   }
+  // Not there yet: its directory resolved, and its name.
   const size_t slash = path.find_last_of('/');
   const std::string directory =
       slash == std::string::npos ? "." : slash == 0 ? "/" : path.substr(0, slash);
+  const std::string name = slash == std::string::npos ? path : path.substr(slash + 1);
   char resolved[PATH_MAX];
   if (realpath(directory.c_str(), resolved) == nullptr) return "path " + path;
-  return "path " + std::string(resolved) + "/" + path.substr(slash + 1);
+  return "path " + std::string(resolved) + "/" + name;
 }
 
 std::string Quoted(const std::string& path) { return "'" + TerminalText(path) + "'"; }

@@ -7,13 +7,13 @@
 #include <unistd.h>
 
 #include <cerrno>
-#include <cstring>
 
 namespace cwtool {
 namespace {
 
 // mkstemp makes files 0600; a new output gets the mode a plain creation
-// would give it. Read once, before any worker creates files.
+// would give it. The umask can only be read by setting it: done once, and
+// harmless to concurrent temporary files, whose modes are set explicitly.
 mode_t CreationMode() {
   static const mode_t mode = [] {
     const mode_t mask = umask(0);
