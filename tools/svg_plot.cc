@@ -4,6 +4,8 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdio>
+#include <utility>
+#include <vector>
 
 #include "tools/text_escape.h"
 

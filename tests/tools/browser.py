@@ -82,7 +82,9 @@ class Pages(unittest.TestCase):
         for name, make, seconds, largest, ink in (
                 ('groove', example, 40, 1_000_000, 0.05),
                 ('five-minutes', example, 300, 6_000_000, 0.05),
-                ('silence', silence, 3, 100_000, 0.001)):
+                ('silence', silence, 3, 100_000, 0.001),
+                ('mono-96k', lambda n, seconds: example(n, 90, 96000, 1, seconds),
+                 12, 500_000, 0.05)):
             with self.subTest(name):
                 html, report = page_of(name, seconds, make)
                 self.assertLessEqual(os.path.getsize(html), largest)
