@@ -75,14 +75,15 @@ def audio_time():
 
 
 class Pages(unittest.TestCase):
-    """The 40-second groove and a 5-minute input: complete, correct, playable."""
+    """Pages of several inputs: complete, correct, playable."""
 
     def test_pages_load_draw_play_and_hold_the_reported_beats(self):
         # Fractions of the canvases' pixels drawn on: a flat line for silence.
         for name, make, seconds, largest, ink in (
                 ('groove', example, 40, 1_000_000, 0.05),
                 ('five-minutes', example, 300, 6_000_000, 0.05),
-                ('silence', silence, 3, 100_000, 0.001),
+                # A name that HTML would take for markup.
+                ('silence <!--<script>&amp;', silence, 3, 100_000, 0.001),
                 ('mono-96k', lambda n, seconds: example(n, 90, 96000, 1, seconds),
                  12, 500_000, 0.05)):
             with self.subTest(name):
@@ -92,6 +93,8 @@ class Pages(unittest.TestCase):
                     self.assertNotIn('://', page.read())  # nothing fetched from anywhere
                 open_page(html)
                 data = json.loads(js('return document.getElementById("clipweaver-data").textContent'))
+                self.assertEqual(DRIVER.find_element(By.ID, 'file').text, report['file'])
+                self.assertEqual(DRIVER.title, report['file'] + ' \N{EM DASH} beats')
                 for key in ('file', 'duration', 'sample_rate', 'channels', 'tempo', 'beats'):
                     self.assertEqual(data[key], report[key], key)
                 if report['tempo'] is None:
