@@ -4,7 +4,6 @@ Screenshots of the pages are left in the work directory.
 """
 import json
 import os
-import time
 import unittest
 import wave
 
@@ -14,6 +13,7 @@ from selenium.webdriver.common.action_chains import ActionChains
 from selenium.webdriver.common.actions.wheel_input import ScrollOrigin
 from selenium.webdriver.common.by import By
 from selenium.webdriver.common.keys import Keys
+from selenium.webdriver.support.wait import WebDriverWait
 
 from tool_harness import beats_json, example, main, path, run
 
@@ -74,6 +74,16 @@ def audio_time():
     return js('return document.getElementById("audio").currentTime')
 
 
+def play_until(seconds):
+    """Plays until the audio has reached `seconds`, however slow the machine."""
+    play = DRIVER.find_element(By.ID, 'play')
+    play.click()
+    WebDriverWait(DRIVER, 30, poll_frequency=0.05).until(lambda _: audio_time() >= seconds)
+    label = play.text
+    play.click()
+    return label
+
+
 class Pages(unittest.TestCase):
     """Pages of several inputs: complete, correct, playable."""
 
@@ -110,11 +120,7 @@ class Pages(unittest.TestCase):
                     self.assertGreater(inked, ink, canvas)
                 self.assertAlmostEqual(js('return document.getElementById("audio").duration'),
                                        seconds, delta=0.1)
-                DRIVER.find_element(By.ID, 'play').click()
-                time.sleep(1.5)
-                self.assertGreater(audio_time(), 0.5)
-                self.assertEqual(DRIVER.find_element(By.ID, 'play').text, 'Pause')
-                DRIVER.find_element(By.ID, 'play').click()
+                self.assertEqual(play_until(1), 'Pause')
                 self.assertEqual(DRIVER.find_element(By.ID, 'play').text, 'Play')
                 DRIVER.save_screenshot(path(name + '.png'))
                 self.assertEqual([entry for entry in DRIVER.get_log('browser')
@@ -183,9 +189,7 @@ class Controls(unittest.TestCase):
         width = self.detail.size['width']
         ActionChains(DRIVER).move_to_element_with_offset(self.detail, width * 45 // 100, 0) \
             .click().perform()
-        DRIVER.find_element(By.ID, 'play').click()
-        time.sleep(1.5)
-        DRIVER.find_element(By.ID, 'play').click()
+        play_until(10.5)
         start, end = visible_range()
         self.assertGreater(start, 9)
         self.assertLess(start, audio_time())
@@ -196,9 +200,7 @@ class Controls(unittest.TestCase):
         ActionChains(DRIVER).move_to_element(self.detail).click().perform()
         seeked = audio_time()
         DRIVER.find_element(By.ID, 'clicks').click()
-        DRIVER.find_element(By.ID, 'play').click()
-        time.sleep(3)
-        DRIVER.find_element(By.ID, 'play').click()
+        play_until(seeked + 3)
         stopped = audio_time()
         queued = js('return window.clipweaver.scheduledClicks')
         played = [b for b in beats if seeked <= b < stopped]
