@@ -33,7 +33,8 @@ sf_count_t Seek(sf_count_t offset, int whence, void* data) {
 
 sf_count_t Read(void* out, sf_count_t count, void* data) {
   Memory* m = static_cast<Memory*>(data);
-  const sf_count_t n = std::max<sf_count_t>(0, std::min(count, Length(data) - m->position));
+  const sf_count_t n = std::min(count, Length(data) - m->position);
+  if (n <= 0) return 0;
   std::memcpy(out, m->bytes.data() + m->position, static_cast<size_t>(n));
   m->position += n;
   return n;

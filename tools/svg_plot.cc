@@ -4,6 +4,8 @@
 #include <cmath>
 #include <cstddef>
 #include <cstdio>
+#include <utility>
+#include <vector>
 
 #include "tools/text_escape.h"
 
@@ -47,14 +49,10 @@ struct Span {
   }
 };
 
-// Outline along the highs and back along the lows, scaled to the loudest
-// moment so that quiet tracks stay readable.
-std::string Envelope(const BeatView& view, const Span& span, double top,
+// Outline along the highs and back along the lows, `peak` reaching the
+// panel's edges.
+std::string Envelope(const BeatView& view, const Span& span, float peak, double top,
                      double bottom) {
-  float peak = 0;
-  for (size_t i = 0; i < view.envelope_low.size(); ++i) {
-    peak = std::max({peak, -view.envelope_low[i], view.envelope_high[i]});
-  }
   const double middle = (top + bottom) / 2;
   const double scale = peak > 0 ? (bottom - top) / 2 / peak : 0;
   std::vector<double> low(static_cast<size_t>(span.columns), middle);
@@ -62,9 +60,11 @@ std::string Envelope(const BeatView& view, const Span& span, double top,
   for (int c = 0; c < span.columns; ++c) {
     const auto [first, last] =
         span.Under(c, view.envelope_per_second, view.envelope_low.size());
+    double& lo = low[static_cast<size_t>(c)];
+    double& hi = high[static_cast<size_t>(c)];
     for (size_t i = first; i < last; ++i) {
-      low[static_cast<size_t>(c)] = std::max(low[static_cast<size_t>(c)], middle - view.envelope_low[i] * scale);
-      high[static_cast<size_t>(c)] = std::min(high[static_cast<size_t>(c)], middle - view.envelope_high[i] * scale);
+      lo = std::max(lo, middle - view.envelope_low[i] * scale);
+      hi = std::min(hi, middle - view.envelope_high[i] * scale);
     }
   }
   std::string path;
@@ -152,6 +152,11 @@ std::string BeatPlotSvg(const BeatView& view) {
   const bool minutes = duration >= 60;
   const float largest_onset =
       view.onset.empty() ? 0.0f : *std::max_element(view.onset.begin(), view.onset.end());
+  // The loudest moment fills the panels, so that quiet tracks stay readable.
+  float peak = 0;
+  for (size_t i = 0; i < view.envelope_low.size(); ++i) {
+    peak = std::max({peak, -view.envelope_low[i], view.envelope_high[i]});
+  }
 
   std::string svg =
       "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
@@ -176,7 +181,7 @@ std::string BeatPlotSvg(const BeatView& view) {
 
   const Span whole{0, duration, kPlotWidth};
   svg += "<g class=\"overview\">\n";
-  svg += Envelope(view, whole, kOverviewTop, kOverviewBottom - 10);
+  svg += Envelope(view, whole, peak, kOverviewTop, kOverviewBottom - 10);
   svg += BeatMarks(view, whole, kOverviewBottom - 8, kOverviewBottom);
   svg += TimeAxis(whole, OverviewStep(duration), kOverviewBottom, minutes);
   svg += "</g>\n";
@@ -188,7 +193,7 @@ std::string BeatPlotSvg(const BeatView& view) {
     const Span span{start, kRowSeconds, std::max(1, columns)};
     svg += Format("<g class=\"row\" transform=\"translate(0,%.0f)\">\n",
                   kFirstRowTop + r * kRowHeight);
-    svg += Envelope(view, span, kWaveTop, kWaveBottom);
+    svg += Envelope(view, span, peak, kWaveTop, kWaveBottom);
     svg += OnsetLine(view, span, largest_onset);
     svg += BeatMarks(view, span, kWaveTop, kOnsetBottom);
     svg += TimeAxis(span, 1, kOnsetBottom, minutes);

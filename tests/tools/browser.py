@@ -4,7 +4,6 @@ Screenshots of the pages are left in the work directory.
 """
 import json
 import os
-import time
 import unittest
 import wave
 
@@ -14,6 +13,7 @@ from selenium.webdriver.common.action_chains import ActionChains
 from selenium.webdriver.common.actions.wheel_input import ScrollOrigin
 from selenium.webdriver.common.by import By
 from selenium.webdriver.common.keys import Keys
+from selenium.webdriver.support.wait import WebDriverWait
 
 from tool_harness import beats_json, example, main, path, run
 
@@ -74,15 +74,28 @@ def audio_time():
     return js('return document.getElementById("audio").currentTime')
 
 
+def play_until(seconds):
+    """Plays until the audio has reached `seconds`, however slow the machine."""
+    play = DRIVER.find_element(By.ID, 'play')
+    play.click()
+    WebDriverWait(DRIVER, 30, poll_frequency=0.05).until(lambda _: audio_time() >= seconds)
+    label = play.text
+    play.click()
+    return label
+
+
 class Pages(unittest.TestCase):
-    """The 40-second groove and a 5-minute input: complete, correct, playable."""
+    """Pages of several inputs: complete, correct, playable."""
 
     def test_pages_load_draw_play_and_hold_the_reported_beats(self):
         # Fractions of the canvases' pixels drawn on: a flat line for silence.
         for name, make, seconds, largest, ink in (
                 ('groove', example, 40, 1_000_000, 0.05),
                 ('five-minutes', example, 300, 6_000_000, 0.05),
-                ('silence', silence, 3, 100_000, 0.001)):
+                # A name that HTML would take for markup.
+                ('silence <!--<script>&amp;', silence, 3, 100_000, 0.001),
+                ('mono-96k', lambda n, seconds: example(n, 90, 96000, 1, seconds),
+                 12, 500_000, 0.05)):
             with self.subTest(name):
                 html, report = page_of(name, seconds, make)
                 self.assertLessEqual(os.path.getsize(html), largest)
@@ -90,6 +103,8 @@ class Pages(unittest.TestCase):
                     self.assertNotIn('://', page.read())  # nothing fetched from anywhere
                 open_page(html)
                 data = json.loads(js('return document.getElementById("clipweaver-data").textContent'))
+                self.assertEqual(DRIVER.find_element(By.ID, 'file').text, report['file'])
+                self.assertEqual(DRIVER.title, report['file'] + ' \N{EM DASH} beats')
                 for key in ('file', 'duration', 'sample_rate', 'channels', 'tempo', 'beats'):
                     self.assertEqual(data[key], report[key], key)
                 if report['tempo'] is None:
@@ -105,11 +120,7 @@ class Pages(unittest.TestCase):
                     self.assertGreater(inked, ink, canvas)
                 self.assertAlmostEqual(js('return document.getElementById("audio").duration'),
                                        seconds, delta=0.1)
-                DRIVER.find_element(By.ID, 'play').click()
-                time.sleep(1.5)
-                self.assertGreater(audio_time(), 0.5)
-                self.assertEqual(DRIVER.find_element(By.ID, 'play').text, 'Pause')
-                DRIVER.find_element(By.ID, 'play').click()
+                self.assertEqual(play_until(1), 'Pause')
                 self.assertEqual(DRIVER.find_element(By.ID, 'play').text, 'Play')
                 DRIVER.save_screenshot(path(name + '.png'))
                 self.assertEqual([entry for entry in DRIVER.get_log('browser')
@@ -178,9 +189,7 @@ class Controls(unittest.TestCase):
         width = self.detail.size['width']
         ActionChains(DRIVER).move_to_element_with_offset(self.detail, width * 45 // 100, 0) \
             .click().perform()
-        DRIVER.find_element(By.ID, 'play').click()
-        time.sleep(1.5)
-        DRIVER.find_element(By.ID, 'play').click()
+        play_until(10.5)
         start, end = visible_range()
         self.assertGreater(start, 9)
         self.assertLess(start, audio_time())
@@ -191,9 +200,7 @@ class Controls(unittest.TestCase):
         ActionChains(DRIVER).move_to_element(self.detail).click().perform()
         seeked = audio_time()
         DRIVER.find_element(By.ID, 'clicks').click()
-        DRIVER.find_element(By.ID, 'play').click()
-        time.sleep(3)
-        DRIVER.find_element(By.ID, 'play').click()
+        play_until(seeked + 3)
         stopped = audio_time()
         queued = js('return window.clipweaver.scheduledClicks')
         played = [b for b in beats if seeked <= b < stopped]
