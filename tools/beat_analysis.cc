@@ -4,7 +4,9 @@
 #include <cstdio>
 #include <limits>
 
+#include "jni/apm/analysis_frame_rate.h"
 #include "jni/apm/audio_analyzer.h"
+#include "jni/apm/tempo_estimate.h"
 #include "tools/audio_file.h"
 #include "tools/click_track.h"
 #include "tools/interrupt.h"
@@ -51,9 +53,9 @@ std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& audio,
     const BeatPlot plot{result.path,
                         &audio,
                         &analyzer.detection_function(),
-                        analyzer.frames_per_second(),
+                        apm::FrameRateAt(audio.sample_rate).true_frames_per_second,
                         &result.beats,
-                        result.bpm};
+                        std::isfinite(result.tempo) ? result.tempo : 0.0};
     if (!WriteBeatPlot(extras.plot_path, plot, &error)) {
       return extras.plot_path + ": " + error;
     }
@@ -61,9 +63,24 @@ std::string WriteExtras(const ExtraOutputs& extras, const DecodedAudio& audio,
   return std::string();
 }
 
+// The library's times count whole frames per second; the frames they name
+// lie at the true rate.
+std::vector<double> TrueTimes(const float* beats, int32_t count,
+                              int32_t frames_per_second, int32_t sample_rate) {
+  const apm::AnalysisFrameRate rate = apm::FrameRateAt(sample_rate);
+  std::vector<double> times(static_cast<size_t>(count));
+  for (int32_t i = 0; i < count; ++i) {
+    const double frame =
+        std::round(static_cast<double>(beats[i]) * frames_per_second);
+    times[i] = frame / rate.true_frames_per_second;
+  }
+  return times;
+}
+
 }  // namespace
 
-BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
+BeatResult AnalyseFile(const std::string& path, const apm::ApmConfig& config,
+                       const ExtraOutputs& extras,
                        const std::function<void(int)>& progress) {
   const std::atomic<bool>& stop = InterruptFlag();
   BeatResult result;
@@ -79,7 +96,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
   result.error = CheckLength(audio);
   if (!result.error.empty()) return result;
 
-  apm::AudioAnalyzer analyzer(audio.sample_rate);
+  apm::AudioAnalyzer analyzer(audio.sample_rate, config);
   const int32_t count = analyzer.CalculateBeats(
       reinterpret_cast<const uint8_t*>(audio.samples.data()),
       static_cast<int32_t>(2 * audio.samples.size()), audio.channels,
@@ -96,7 +113,10 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     result.error = "the analysis failed (see --verbose for its log)";
     return result;
   }
-  result.beats.assign(analyzer.beats(), analyzer.beats() + count);
+  const std::vector<double> times = TrueTimes(
+      analyzer.beats(), count, analyzer.frames_per_second(), audio.sample_rate);
+  result.beats.assign(times.begin(), times.end());
+  result.tempo = apm::PreciseTempo(times);
   if (count >= 2 && std::isfinite(analyzer.bpm()) && analyzer.bpm() > 0) {
     result.bpm = analyzer.bpm();
   }

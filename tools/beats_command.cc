@@ -4,9 +4,11 @@
 #include <unistd.h>
 
 #include <algorithm>
+#include <cstdio>
 #include <thread>
 #include <vector>
 
+#include "jni/apm/tempo_range.h"
 #include "tools/beat_analysis.h"
 #include "tools/console.h"
 #include "tools/interrupt.h"
@@ -35,6 +37,18 @@ ExtraOutputs ExtrasFor(const BeatsOptions& options, const std::string& file) {
 }  // namespace
 
 int RunBeats(const BeatsOptions& options) {
+  // A range too narrow for some input is a usage error: refused before any
+  // file is analysed.
+  const std::string range_error =
+      CheckTempoRangeForFiles(options.tempo, options.files);
+  if (!range_error.empty()) {
+    fprintf(stderr, "clipweaver: %s\n", range_error.c_str());
+    return 2;
+  }
+  const apm::ApmConfig config =
+      options.tempo.given
+          ? apm::ConfigForTempoRange(options.tempo.min_bpm, options.tempo.max_bpm)
+          : apm::ApmConfig();
   const size_t count = options.files.size();
   const int cores = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
   const int workers = static_cast<int>(
@@ -58,7 +72,7 @@ int RunBeats(const BeatsOptions& options) {
       const std::string label = BaseName(file);
       console.Progress(worker, label, 0);
       results[index] = AnalyseFile(
-          file, ExtrasFor(options, file),
+          file, config, ExtrasFor(options, file),
           [&](int percent) { console.Progress(worker, label, percent); });
       console.ProgressIdle(worker);
     });

@@ -19,7 +19,7 @@ struct OptionSpec {
 const std::vector<OptionSpec> kBeatsOptions = {
     {"format", 0, true}, {"jobs", 'j', true},  {"quiet", 'q', false},
     {"verbose", 'v', false}, {"click", 0, true}, {"plot", 0, true},
-    {"help", 'h', false}};
+    {"tempo", 0, true}, {"help", 'h', false}};
 const std::vector<OptionSpec> kResampleOptions = {
     {"rate", 0, true}, {"gain", 0, true}, {"help", 'h', false}};
 const std::vector<OptionSpec> kExampleOptions = {
@@ -152,6 +152,10 @@ std::string ParseBeats(const Arguments& a, BeatsOptions* out) {
   }
   if (a.values.count("jobs") && !ParseInt(a.values.at("jobs"), 1, 1024, &out->jobs)) {
     return "--jobs '" + a.values.at("jobs") + "' is not a number from 1 to 1024";
+  }
+  if (a.values.count("tempo")) {
+    const std::string error = ParseTempoRange(a.values.at("tempo"), &out->tempo);
+    if (!error.empty()) return error;
   }
   for (const char* option : {"click", "plot"}) {
     if (!a.values.count(option)) continue;
@@ -296,6 +300,8 @@ format libsndfile reads will do: WAV, FLAC, Ogg Vorbis, AIFF, ...
                   results still come in the order of the arguments
   --click OUT     also write the input mixed with a click on every beat
   --plot OUT.svg  also draw the waveform, the onset strength and the beats
+  --tempo MIN-MAX only look for tempi from MIN to MAX BPM (within 30-1200),
+                  e.g. 150-200 where the default finds half or 2/3 time
                   With several files OUT must hold '{}', which stands for
                   each input's name without directory and extension.
   -q, --quiet     no progress bar (it is only drawn when stderr is a terminal)
@@ -327,6 +333,7 @@ Examples:
   clipweaver beats groove.wav
   clipweaver beats --format json -j 4 music/*.flac > beats.jsonl
   clipweaver beats song.ogg --click song-clicks.wav --plot song.svg
+  clipweaver beats ballad.flac --tempo 50-80
   clipweaver beats *.wav --plot 'plots/{}.svg' --quiet
   clipweaver resample song.wav song-48k.flac --rate 48000 --gain 0.8,0.8
 )";

@@ -8,6 +8,7 @@
 #include "tools/example_groove.h"
 #include "tools/report.h"
 #include "tools/resample_file.h"
+#include "tools/tempo_option.h"
 
 namespace cwtool {
 
@@ -21,6 +22,7 @@ struct BeatsOptions {
   // without directory and extension.
   std::string click_pattern;
   std::string plot_pattern;
+  TempoRangeOption tempo;  // not given: the tracker's own range
 };
 
 struct CommandLine {

@@ -63,7 +63,7 @@ std::string Envelope(const DecodedAudio& audio) {
 }
 
 // The largest onset value per pixel column, scaled to the panel.
-std::string OnsetLine(const std::vector<float>& onset, int32_t fps,
+std::string OnsetLine(const std::vector<float>& onset, double fps,
                       double duration) {
   if (onset.empty() || fps <= 0 || duration <= 0) return std::string();
   const float largest = *std::max_element(onset.begin(), onset.end());

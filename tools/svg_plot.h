@@ -15,7 +15,7 @@ struct BeatPlot {
   std::string name;
   const DecodedAudio* audio;
   const std::vector<float>* onset;  // one value per analysis frame
-  int32_t frames_per_second;
+  double frames_per_second;
   const std::vector<float>* beats;  // seconds
   double bpm;                       // 0: unknown
 };

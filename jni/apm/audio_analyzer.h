@@ -30,7 +30,8 @@ bool NormalizeDetectionFunction(std::vector<float>* values);
 
 class AudioAnalyzer {
  public:
-  explicit AudioAnalyzer(int32_t sample_rate);
+  explicit AudioAnalyzer(int32_t sample_rate,
+                         const ApmConfig& config = ApmConfig());
   virtual ~AudioAnalyzer();
   AudioAnalyzer(const AudioAnalyzer&) = delete;
   AudioAnalyzer& operator=(const AudioAnalyzer&) = delete;
@@ -65,6 +66,7 @@ class AudioAnalyzer {
   // One block of mono samples at a time: the whole signal is never held.
   std::vector<float> samples_;
   int32_t sample_rate_;
+  ApmConfig config_;
   std::unique_ptr<Apm> tracker_;
   SpectrogramCalculator spectrogram_calculator_;
   OnsetDetector onset_detector_;

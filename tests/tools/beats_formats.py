@@ -53,7 +53,7 @@ class OutputFormats(unittest.TestCase):
         self.assertEqual([json.loads(l)['file'] for l in lines], order)
         self.assertEqual(set(json.loads(lines[0])),
                          {'file', 'duration', 'sample_rate', 'channels',
-                          'tempo', 'beats'})
+                          'tempo', 'tracker_tempo', 'beats'})
 
     def test_csv_holds_one_row_per_beat(self):
         groove = example('a.wav', 120)
@@ -74,7 +74,7 @@ class OutputFormats(unittest.TestCase):
         lines = done.stdout.splitlines()
         self.assertEqual(
             lines[0],
-            groove + ': 120.00 BPM, 40 beats in 20.00 s (44100 Hz, 2 channels)')
+            groove + ': 120.02 BPM, 40 beats in 20.00 s (44100 Hz, 2 channels)')
         times = [float(t) for line in lines[1:] for t in line.split()]
         self.assertEqual(len(times), 40)
         self.assertTrue(all(len(line.split()) <= 8 for line in lines[1:]))

@@ -93,7 +93,7 @@ class Interrupt(unittest.TestCase):
         process.send_signal(signal.SIGINT)
         rest, errors = process.communicate(timeout=60)
         self.assertEqual(process.returncode, 130)
-        self.assertTrue(first.startswith(short + ': 120.00 BPM'))
+        self.assertTrue(first.startswith(short + ': 120.02 BPM'))
         self.assertNotIn(long, rest)
         self.assertEqual(errors, 'clipweaver: interrupted\n')
 
