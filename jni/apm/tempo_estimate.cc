@@ -17,6 +17,33 @@ int BeatsSpanned(double interval, double median) {
   return 0;
 }
 
+struct Line {
+  double slope = 0, mean_x = 0, mean_t = 0;
+  double Residual(double x, double t) const {
+    return t - mean_t - slope * (x - mean_x);
+  }
+};
+
+// Least squares of t against x over the points lo..hi.
+Line Fit(const std::vector<double>& x, const double* t, size_t lo, size_t hi) {
+  Line line;
+  const double count = static_cast<double>(hi - lo + 1);
+  for (size_t k = lo; k <= hi; ++k) {
+    line.mean_x += x[k];
+    line.mean_t += t[k];
+  }
+  line.mean_x /= count;
+  line.mean_t /= count;
+  double sxt = 0, sxx = 0;
+  for (size_t k = lo; k <= hi; ++k) {
+    const double dx = x[k] - line.mean_x;
+    sxt += dx * (t[k] - line.mean_t);
+    sxx += dx * dx;
+  }
+  line.slope = sxt / sxx;
+  return line;
+}
+
 }  // namespace
 
 double PreciseTempo(const std::vector<double>& beat_times) {
@@ -51,21 +78,20 @@ double PreciseTempo(const std::vector<double>& beat_times) {
     number[k] = number[k - 1] +
                 BeatsSpanned(intervals[best_first + k - 1], median);
   }
-  double mean_x = 0, mean_t = 0;
-  for (size_t k = 0; k <= best_count; ++k) {
-    mean_x += number[k];
-    mean_t += beat_times[best_first + k];
+  const double* times = beat_times.data() + best_first;
+  // A tracker settling on its period drifts off the line of the locked
+  // beats: the end further off goes until both ends fit.
+  size_t lo = 0, hi = best_count;
+  Line line = Fit(number, times, lo, hi);
+  while (hi - lo >= 3) {
+    const double off_lo = std::fabs(line.Residual(number[lo], times[lo]));
+    const double off_hi = std::fabs(line.Residual(number[hi], times[hi]));
+    const double limit = kEndTolerance * line.slope;
+    if (off_lo <= limit && off_hi <= limit) break;
+    off_lo >= off_hi ? ++lo : --hi;
+    line = Fit(number, times, lo, hi);
   }
-  mean_x /= static_cast<double>(best_count + 1);
-  mean_t /= static_cast<double>(best_count + 1);
-  double sxt = 0, sxx = 0;
-  for (size_t k = 0; k <= best_count; ++k) {
-    const double dx = number[k] - mean_x;
-    sxt += dx * (beat_times[best_first + k] - mean_t);
-    sxx += dx * dx;
-  }
-  const double seconds_per_beat = sxt / sxx;
-  return seconds_per_beat > 0 ? 60.0 / seconds_per_beat : unknown;
+  return line.slope > 0 ? 60.0 / line.slope : unknown;
 }
 
 }  // namespace apm

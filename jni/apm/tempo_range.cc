@@ -17,7 +17,8 @@ std::string Bpm(double value) {
   char* end = text + strlen(text);
   while (end[-1] == '0') --end;
   if (end[-1] == '.') --end;
-  return std::string(text, end);
+  const std::string out(text, end);
+  return out == "-0" ? "0" : out;
 }
 
 // The tracker's own rounding of a period to frames.
