@@ -41,8 +41,8 @@ struct ExtraOutputs {
 
 // Beat times are in true seconds: frames are counted at the sample rate
 // over the analysis step, not at the whole frames per second the library's
-// times assume. progress gets 0..100 percent. Stops early, with `interrupted` set, once
-// Ctrl-C has been pressed.
+// times assume. progress gets 0..100 percent. Stops early, with
+// `interrupted` set, once Ctrl-C has been pressed.
 BeatResult AnalyseFile(const std::string& path, const apm::ApmConfig& config,
                        const ExtraOutputs& extras,
                        const std::function<void(int)>& progress);

@@ -300,10 +300,10 @@ format libsndfile reads will do: WAV, FLAC, Ogg Vorbis, AIFF, ...
                   results still come in the order of the arguments
   --click OUT     also write the input mixed with a click on every beat
   --plot OUT.svg  also draw the waveform, the onset strength and the beats
-  --tempo MIN-MAX only look for tempi from MIN to MAX BPM (within 30-1200),
-                  e.g. 150-200 where the default finds half or 2/3 time
                   With several files OUT must hold '{}', which stands for
                   each input's name without directory and extension.
+  --tempo MIN-MAX only look for tempi from MIN to MAX BPM (within 30-1200),
+                  e.g. 150-210 where the default finds half or 2/3 time
   -q, --quiet     no progress bar (it is only drawn when stderr is a terminal)
   -v, --verbose   let the analysis log through to stderr (no progress bar)
   Files shorter than 1 second are refused. Ctrl-C stops the analysis,

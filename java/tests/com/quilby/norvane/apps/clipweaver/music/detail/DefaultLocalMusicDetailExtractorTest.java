@@ -139,30 +139,6 @@ class DefaultLocalMusicDetailExtractorTest {
     assertEquals(bpm, inRange, 0.005 * bpm);
   }
 
-  @ParameterizedTest
-  @CsvSource(
-      delimiter = '|',
-      value = {
-        "NaN | 180 | 44100 | tempo range NaN-180 BPM is not a range: both ends must be numbers"
-            + " within 30-1200 BPM",
-        "80 | 60 | 44100 | tempo range 80-60 BPM is empty: the minimum must be below the maximum",
-        "20 | 80 | 44100 | tempo range 20-80 BPM is outside 30-1200 BPM",
-        "1150 | 1200 | 22050 | tempo range 1150-1200 BPM is too narrow: at 99 frames per second"
-            + " it holds 1 beat period, 3 are needed"
-      })
-  void badRangesAreRefusedBeforeAnyWork(float minBpm, float maxBpm, int rate, String message) {
-    List<Integer> progress = new ArrayList<>();
-    DefaultLocalMusicDetailExtractor extractor =
-        new DefaultLocalMusicDetailExtractor(p -> !progress.add(p));
-    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(2, rate, 1, 120));
-    IllegalArgumentException thrown =
-        assertThrows(
-            IllegalArgumentException.class,
-            () -> extractor.calculateBeatsInSec(pcm, pcm.capacity(), rate, 1, minBpm, maxBpm));
-    assertEquals(message, thrown.getMessage());
-    assertEquals(List.of(), progress);
-  }
-
   @Test
   void aBadRangeReachingTheNativeEntryLogsOneErrorAndReturnsNothing() throws Exception {
     ChildJvm child = ChildJvm.run(BeatScenario.class, "range-refused-natively");

@@ -1,10 +1,13 @@
 package com.quilby.norvane.apps.clipweaver.music.detail;
 
 import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertThrows;
 import static org.junit.jupiter.api.Assertions.assertTrue;
 
+import java.nio.ByteBuffer;
 import java.nio.file.Files;
 import java.nio.file.Path;
+import java.util.ArrayList;
 import java.util.List;
 import java.util.Random;
 import org.junit.jupiter.api.Test;
@@ -65,23 +68,33 @@ class TempoTest {
   }
 
   // The native library reads the same table: both refuse the same ranges in
-  // the same words.
+  // the same words, and the extractor refuses them before any work.
   @Test
-  void rangeVerdictsMatchTheNativeLibrarys() throws Exception {
+  void badRangesAreRefusedAsByTheNativeLibrary() throws Exception {
     Path cases =
         Path.of(System.getProperty("clipweaver.source"), "tests/jni/apm/tempo_range_cases.tsv");
+    List<Integer> progress = new ArrayList<>();
+    DefaultLocalMusicDetailExtractor extractor =
+        new DefaultLocalMusicDetailExtractor(p -> !progress.add(p));
+    ByteBuffer pcm = ByteBuffer.allocateDirect(88200);
     int rows = 0;
     for (String line : Files.readAllLines(cases)) {
       if (line.isEmpty() || line.startsWith("#")) continue;
       String[] f = line.split("\t", -1);
-      String expected = f[3].isEmpty() ? null : f[3];
-      assertEquals(
-          expected,
-          TempoRange.error(
-              Float.parseFloat(f[0]), Float.parseFloat(f[1]), Integer.parseInt(f[2])),
-          line);
+      float min = Float.parseFloat(f[0]);
+      float max = Float.parseFloat(f[1]);
+      int rate = Integer.parseInt(f[2]);
+      assertEquals(f[3].isEmpty() ? null : f[3], TempoRange.error(min, max, rate), line);
+      if (!f[3].isEmpty()) {
+        IllegalArgumentException thrown =
+            assertThrows(
+                IllegalArgumentException.class,
+                () -> extractor.calculateBeatsInSec(pcm, pcm.capacity(), rate, 1, min, max));
+        assertEquals(f[3], thrown.getMessage());
+      }
       rows++;
     }
     assertTrue(rows >= 10);
+    assertEquals(List.of(), progress);
   }
 }
