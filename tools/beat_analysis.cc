@@ -5,7 +5,9 @@
 #include <memory>
 #include <utility>
 
+#include "jni/apm/analysis_frame_rate.h"
 #include "jni/apm/audio_analyzer.h"
+#include "jni/apm/tempo_estimate.h"
 #include "tools/audio_file.h"
 #include "tools/beat_view.h"
 #include "tools/click_track.h"
@@ -38,7 +40,7 @@ std::string TooShort(double seconds) {
 // analysis's largest part, are gone before the views are drawn.
 struct OnsetCurve {
   std::vector<float> values;
-  int32_t per_second = 0;
+  double per_second = 0;  // at the true frame rate, as the beats are
 };
 
 std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
@@ -84,9 +86,24 @@ int64_t Stream(AudioReader* reader, apm::AudioAnalyzer* analyzer,
   return frames;
 }
 
+// The library's times count whole frames per second; the frames they name
+// lie at the true rate.
+std::vector<double> TrueTimes(const float* beats, int32_t count,
+                              int32_t frames_per_second, int32_t sample_rate) {
+  const apm::AnalysisFrameRate rate = apm::FrameRateAt(sample_rate);
+  std::vector<double> times(static_cast<size_t>(count));
+  for (int32_t i = 0; i < count; ++i) {
+    const double frame =
+        std::round(static_cast<double>(beats[i]) * frames_per_second);
+    times[i] = frame / rate.true_frames_per_second;
+  }
+  return times;
+}
+
 }  // namespace
 
-BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
+BeatResult AnalyseFile(const std::string& path, const apm::ApmConfig& config,
+                       const ExtraOutputs& extras,
                        const std::function<void(int)>& progress) {
   BeatResult result;
   result.path = path;
@@ -103,7 +120,7 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     return result;
   }
 
-  auto analyzer = std::make_unique<apm::AudioAnalyzer>(result.sample_rate);
+  auto analyzer = std::make_unique<apm::AudioAnalyzer>(result.sample_rate, config);
   const auto analyzer_progress = [&](char byte) {
     progress(static_cast<unsigned char>(byte) * 100 / 99);
     return Interrupted();
@@ -142,12 +159,18 @@ BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
     result.error = "the analysis failed (see --verbose for its log)";
     return result;
   }
-  result.beats.assign(analyzer->beats(), analyzer->beats() + count);
+  const std::vector<double> times = TrueTimes(
+      analyzer->beats(), count, analyzer->frames_per_second(), result.sample_rate);
+  result.beats.assign(times.begin(), times.end());
+  result.tempo = apm::PreciseTempo(times);
   if (count >= 2 && std::isfinite(analyzer->bpm()) && analyzer->bpm() > 0) {
     result.bpm = analyzer->bpm();
   }
   OnsetCurve onset;
-  if (signal) onset = {analyzer->detection_function(), analyzer->frames_per_second()};
+  if (signal) {
+    onset = {analyzer->detection_function(),
+             apm::FrameRateAt(result.sample_rate).true_frames_per_second};
+  }
   analyzer.reset();
   result.output_error = WriteExtras(extras, signal.get(), std::move(onset), result);
   if (Interrupted()) {

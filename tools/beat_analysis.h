@@ -6,8 +6,11 @@
 
 #include <cstdint>
 #include <functional>
+#include <limits>
 #include <string>
 #include <vector>
+
+#include "jni/apm/apm.h"
 
 namespace cwtool {
 
@@ -22,7 +25,11 @@ struct BeatResult {
   int32_t sample_rate = 0;
   int32_t channels = 0;
   double duration = 0;  // seconds
-  double bpm = 0;       // 0: unknown (fewer than two beats)
+  // The tracker's figure, 60 over its median beat interval, in whole
+  // frames; 0: unknown (fewer than two beats).
+  double bpm = 0;
+  // The precise tempo of the beats; NaN: unknown.
+  double tempo = std::numeric_limits<double>::quiet_NaN();
   std::vector<float> beats;
   // A click track, plot or page that could not be written; the result stands.
   std::string output_error;
@@ -34,9 +41,12 @@ struct ExtraOutputs {
   std::string html_path;
 };
 
-// progress gets 0..100 percent. Stops early, with `interrupted` set and no
-// extra output left behind, once Ctrl-C has been pressed.
-BeatResult AnalyseFile(const std::string& path, const ExtraOutputs& extras,
+// Beat times are in true seconds: frames are counted at the sample rate
+// over the analysis step, not at the whole frames per second the library's
+// times assume. progress gets 0..100 percent. Stops early, with
+// `interrupted` set, once Ctrl-C has been pressed.
+BeatResult AnalyseFile(const std::string& path, const apm::ApmConfig& config,
+                       const ExtraOutputs& extras,
                        const std::function<void(int)>& progress);
 
 }  // namespace cwtool

@@ -28,15 +28,13 @@ void BeatViewSignal::Add(const int16_t* frames, int64_t count) {
 }
 
 bool BeatViewSignal::MakeView(const BeatResult& result, std::vector<float> onset,
-                              int32_t onset_per_second, BeatView* view,
+                              double onset_per_second, BeatView* view,
                               std::string* error) {
   view->file = result.path;
   view->duration = result.duration;
   view->sample_rate = result.sample_rate;
   view->channels = result.channels;
-  // Until a tempo of its own is measured, the tracker's figure stands for
-  // both.
-  view->tempo = result.bpm;
+  view->tempo = result.tempo;
   view->tracker_tempo = result.bpm;
   view->beats = result.beats;
   view->envelope_per_second = kEnvelopePerSecond;

@@ -26,7 +26,7 @@ struct BeatView {
   int32_t envelope_per_second = 0;
   std::vector<float> envelope_low, envelope_high;
   // The conditioned onset strength, one value per analysis frame.
-  int32_t onset_per_second = 0;
+  double onset_per_second = 0;
   std::vector<float> onset;
   // The track itself, compactly encoded; empty when not wanted.
   std::string audio_mime;
@@ -48,7 +48,7 @@ class BeatViewSignal {
   // The view of the analysed file, once: the signal's data move into it.
   // On failure *error says why.
   bool MakeView(const BeatResult& result, std::vector<float> onset,
-                int32_t onset_per_second, BeatView* view, std::string* error);
+                double onset_per_second, BeatView* view, std::string* error);
 
  private:
   WaveEnvelope envelope_;

@@ -9,6 +9,7 @@
 #include <vector>
 
 #include "base/platform_log.h"
+#include "jni/apm/tempo_range.h"
 #include "tools/beat_analysis.h"
 #include "tools/console.h"
 #include "tools/interrupt.h"
@@ -52,11 +53,23 @@ std::string CheckOutputs(const BeatsOptions& options) {
 }  // namespace
 
 int RunBeats(const BeatsOptions& options) {
+  // A range too narrow for some input is a usage error: refused before any
+  // file is analysed.
+  const std::string range_error =
+      CheckTempoRangeForFiles(options.tempo, options.files);
+  if (!range_error.empty()) {
+    fprintf(stderr, "clipweaver: %s\n", range_error.c_str());
+    return 2;
+  }
   const std::string collision = CheckOutputs(options);
   if (!collision.empty()) {
     fprintf(stderr, "clipweaver: %s\n", collision.c_str());
     return 2;
   }
+  const apm::ApmConfig config =
+      options.tempo.given
+          ? apm::ConfigForTempoRange(options.tempo.min_bpm, options.tempo.max_bpm)
+          : apm::ApmConfig();
   const size_t count = options.files.size();
   const int cores = static_cast<int>(std::max(1u, std::thread::hardware_concurrency()));
   const int workers = static_cast<int>(
@@ -78,7 +91,7 @@ int RunBeats(const BeatsOptions& options) {
       const std::string label = TerminalText(BaseName(file));
       console.Progress(worker, label, 0);
       results[index] = AnalyseFile(
-          file, ExtrasFor(options, file),
+          file, config, ExtrasFor(options, file),
           [&](int percent) { console.Progress(worker, label, percent); });
       console.ProgressIdle(worker);
     });

@@ -42,6 +42,9 @@ constexpr OptionSpec kOptions[] = {
      "beats (zoom, seek, a click on every beat), usable offline\n"
      "With several files OUT must hold '{}', which stands for\n"
      "each input's name without directory and extension."},
+    {kBeatsCommand, "tempo", 0, "MIN-MAX",
+     "only look for tempi from MIN to MAX BPM (within 30-1200),\n"
+     "e.g. 150-210 where the default finds half or 2/3 time"},
     {kBeatsCommand, "quiet", 'q', nullptr,
      "no progress bar (it is only drawn when stderr is a terminal)"},
     {kBeatsCommand, "verbose", 'v', nullptr,
@@ -205,6 +208,10 @@ std::string ParseBeats(const Arguments& a, BeatsOptions* out) {
   }
   if (a.values.count("jobs") && !ParseInt(a.values.at("jobs"), 1, 1024, &out->jobs)) {
     return "--jobs '" + a.values.at("jobs") + "' is not a number from 1 to 1024";
+  }
+  if (a.values.count("tempo")) {
+    const std::string error = ParseTempoRange(a.values.at("tempo"), &out->tempo);
+    if (!error.empty()) return error;
   }
   // Each output option: its pattern, the ending it needs (empty: an audio
   // format's) and the example its help gives for several files.
@@ -399,6 +406,7 @@ Examples:
   clipweaver beats groove.wav
   clipweaver beats --format json -j 4 music/*.flac > beats.jsonl
   clipweaver beats song.ogg --click song-clicks.wav --plot song.svg
+  clipweaver beats ballad.flac --tempo 50-80
   clipweaver beats *.wav --plot 'plots/{}.svg' --quiet
   clipweaver resample song.wav song-48k.flac --rate 48000 --gain 0.8,0.8
 )";

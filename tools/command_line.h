@@ -8,6 +8,7 @@
 #include "tools/example_groove.h"
 #include "tools/report.h"
 #include "tools/resample_file.h"
+#include "tools/tempo_option.h"
 
 namespace cwtool {
 
@@ -22,6 +23,7 @@ struct BeatsOptions {
   std::string click_pattern;
   std::string plot_pattern;
   std::string html_pattern;
+  TempoRangeOption tempo;  // not given: the tracker's own range
 };
 
 struct CommandLine {

@@ -47,7 +47,7 @@ std::string DataJson(const BeatView& view) {
   out += "],\"envelope_per_second\":" + std::to_string(view.envelope_per_second) +
          ",\"envelope_low\":" + Milli(view.envelope_low, 1) +
          ",\"envelope_high\":" + Milli(view.envelope_high, 1) +
-         ",\"onset_per_second\":" + std::to_string(view.onset_per_second) +
+         ",\"onset_per_second\":" + Number("%.10g", view.onset_per_second) +
          ",\"onset\":" + Milli(view.onset, largest_onset) + "}";
   // A file name holding "</script>" must not end the element early.
   std::string safe;

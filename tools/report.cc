@@ -1,5 +1,6 @@
 #include "tools/report.h"
 
+#include <cmath>
 #include <cstdio>
 
 #include "tools/text_escape.h"
@@ -15,9 +16,11 @@ std::string Number(const char* format, double value) {
   return text;
 }
 
+bool Known(double tempo) { return std::isfinite(tempo) && tempo > 0; }
+
 std::string Text(const BeatResult& r) {
   std::string out = TerminalText(r.path) + ": ";
-  out += r.bpm > 0 ? Number("%.2f BPM", r.bpm) : "tempo unknown";
+  out += Known(r.tempo) ? Number("%.2f BPM", r.tempo) : "tempo unknown";
   out += ", " + std::to_string(r.beats.size()) + " beats in " +
          Number("%.2f s", r.duration) + " (" + std::to_string(r.sample_rate) +
          " Hz, " + std::to_string(r.channels) +
@@ -34,7 +37,7 @@ std::string Text(const BeatResult& r) {
 std::string Csv(const BeatResult& r) {
   std::string out;
   const std::string prefix =
-      CsvField(r.path) + "," + (r.bpm > 0 ? Number("%.3f", r.bpm) : "") + ",";
+      CsvField(r.path) + "," + (Known(r.tempo) ? Number("%.3f", r.tempo) : "") + ",";
   for (size_t i = 0; i < r.beats.size(); ++i) {
     out += prefix + std::to_string(i + 1) + "," + Number("%.3f", r.beats[i]) + "\n";
   }
@@ -46,7 +49,8 @@ std::string Json(const BeatResult& r) {
                     ",\"duration\":" + Number("%.3f", r.duration) +
                     ",\"sample_rate\":" + std::to_string(r.sample_rate) +
                     ",\"channels\":" + std::to_string(r.channels) +
-                    ",\"tempo\":" + (r.bpm > 0 ? Number("%.3f", r.bpm) : "null") +
+                    ",\"tempo\":" + (Known(r.tempo) ? Number("%.3f", r.tempo) : "null") +
+                    ",\"tracker_tempo\":" + (Known(r.bpm) ? Number("%.3f", r.bpm) : "null") +
                     ",\"beats\":[";
   for (size_t i = 0; i < r.beats.size(); ++i) {
     if (i > 0) out += ',';

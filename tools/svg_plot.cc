@@ -40,7 +40,7 @@ struct Span {
 
   double X(double t) const { return kLeft + kPlotWidth * (t - start) / seconds; }
   // Indices [first, last) of the values at `per_second` under one column.
-  std::pair<size_t, size_t> Under(int column, int32_t per_second, size_t count) const {
+  std::pair<size_t, size_t> Under(int column, double per_second, size_t count) const {
     const double t0 = start + seconds * column / kPlotWidth;
     const double t1 = start + seconds * (column + 1) / kPlotWidth;
     const size_t first = std::min(count, static_cast<size_t>(t0 * per_second));

@@ -8,6 +8,8 @@
 #include <cstring>
 
 #include "base/logging.h"
+#include "jni/apm/analysis_frame_rate.h"
+#include "jni/apm/tempo_range.h"
 
 namespace apm {
 namespace {
@@ -285,6 +287,43 @@ Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtr
     return env->NewFloatArray(0);
   }
   apm::AudioAnalyzer analyzer(sample_rate);
+  JavaProgress java_progress(env, receiver);
+  int32_t n = analyzer.CalculateBeats(
+      data, size_in_bytes, channel_count,
+      [&java_progress](char progress) { return java_progress(progress); });
+  if (n < 0) {
+    LOG(ERROR) << "Failed to retrieve beats from APM!";
+    n = 0;
+  }
+  LOG(INFO) << "Gets " << n << " beats from APM!";
+  if (java_progress.threw()) return nullptr;
+  jfloatArray beats = env->NewFloatArray(n);
+  if (beats == nullptr) return nullptr;
+  if (n > 0) env->SetFloatArrayRegion(beats, 0, n, analyzer.beats());
+  return beats;
+}
+
+// The same analysis with the tracker held to a tempo range. The Java side
+// checks the range first; one reaching here anyway is refused before any
+// work.
+extern "C" JNIEXPORT jfloatArray JNICALL
+Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtractor_calculateBeatsInTempoRange(
+    JNIEnv* env, jobject receiver, jobject pcm_buffer, jint size_in_bytes,
+    jint sample_rate, jint channel_count, jfloat min_bpm, jfloat max_bpm) {
+  if (env == nullptr || receiver == nullptr) return nullptr;
+  const std::string range_error = apm::TempoRangeError(
+      min_bpm, max_bpm, apm::FrameRateAt(sample_rate).frames_per_second);
+  if (!range_error.empty()) {
+    LOG(ERROR) << "Refused: " << range_error << ".";
+    return env->NewFloatArray(0);
+  }
+  const uint8_t* data = DirectPcm(env, pcm_buffer, &size_in_bytes);
+  if (data == nullptr) {
+    LOG(ERROR) << "The PCM buffer is not a direct buffer: nothing analysed.";
+    return env->NewFloatArray(0);
+  }
+  apm::AudioAnalyzer analyzer(sample_rate,
+                              apm::ConfigForTempoRange(min_bpm, max_bpm));
   JavaProgress java_progress(env, receiver);
   int32_t n = analyzer.CalculateBeats(
       data, size_in_bytes, channel_count,

@@ -34,6 +34,7 @@ bool NormalizeDetectionFunction(std::vector<float>* values);
 
 class AudioAnalyzer {
  public:
+  // config sets up the tracker; the default is the JNI beat entry's.
   explicit AudioAnalyzer(int32_t sample_rate,
                          const ApmConfig& config = ApmConfig());
   virtual ~AudioAnalyzer();

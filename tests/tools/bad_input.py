@@ -136,7 +136,7 @@ class Refusals(unittest.TestCase):
         self.assertEqual(done.returncode, 1)
         results = [json.loads(line) for line in done.stdout.splitlines()]
         self.assertEqual([r['file'] for r in results], bad[:3] + ['a.wav'] + bad[3:])
-        self.assertEqual(results[3]['tempo'], 120.0)
+        self.assertEqual((results[3]['tempo'], results[3]['tracker_tempo']), (120.0, 120.0))
         self.assertEqual(results[0], {'file': 'missing.wav', 'error': 'no such file'})
         self.assertEqual(len(done.stderr.splitlines()), len(bad))
 

@@ -58,6 +58,35 @@ public class DefaultLocalMusicDetailExtractor {
       ByteBuffer pcm, int sizeInBytes, int sampleRate, int channelCount);
 
   /**
+   * Analyses PCM audio as {@link #calculateBeatsInSec(ByteBuffer, int, int, int)}
+   * does, with the tracker held to tempi from {@code minBpm} to {@code maxBpm}.
+   * Use it when the tempo is roughly known and the default finds half, double
+   * or two-thirds time: a range of the expected tempo divided and multiplied
+   * by 1.3 suits most music. The tracker favours the geometric middle of the
+   * range; a range of two octaves or more around 120 BPM keeps its own
+   * preference for 120, so 75 to 1200 BPM gives exactly the four-argument
+   * call's beats. Progress and cancellation are the same.
+   *
+   * @param minBpm slowest tempo, at least 30
+   * @param maxBpm fastest tempo, above {@code minBpm} and at most 1200
+   * @throws IllegalArgumentException before any analysis when the range is not
+   *     finite, empty, outside 30 to 1200 BPM, or too narrow for the tracker at
+   *     this sample rate (it needs three beat periods and 100 states); the
+   *     message says which
+   */
+  public float[] calculateBeatsInSec(
+      ByteBuffer pcm, int sizeInBytes, int sampleRate, int channelCount, float minBpm, float maxBpm) {
+    String error = TempoRange.error(minBpm, maxBpm, sampleRate);
+    if (error != null) throw new IllegalArgumentException(error);
+    return calculateBeatsInTempoRange(pcm, sizeInBytes, sampleRate, channelCount, minBpm, maxBpm);
+  }
+
+  // Its own name: the JVM binds native methods by short name first, so a
+  // second native calculateBeatsInSec would reach the four-argument entry.
+  private native float[] calculateBeatsInTempoRange(
+      ByteBuffer pcm, int sizeInBytes, int sampleRate, int channelCount, float minBpm, float maxBpm);
+
+  /**
    * Called by the native analysis with its progress, on the calling thread.
    * Override it, or set a {@link ProgressListener}, to follow or cancel.
    *

@@ -1,5 +1,6 @@
 package com.quilby.norvane.apps.clipweaver.music.detail;
 
+import java.lang.reflect.Method;
 import java.nio.ByteBuffer;
 import java.util.ArrayList;
 import java.util.List;
@@ -43,11 +44,29 @@ public final class BeatScenario {
       case "oversized":
         beats = extractor.calculateBeatsInSec(pcm, pcm.capacity() + 1000, 44100, 1);
         break;
+      case "range-refused-natively":
+        beats = rangeEntry(extractor, pcm, Float.NaN, 180);
+        break;
       default:
         beats = extractor.calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1);
         break;
     }
     System.out.println(progress);
     System.out.println(beats.length);
+  }
+
+  // The native entry behind the range overload, reached past its Java check.
+  private static float[] rangeEntry(
+      DefaultLocalMusicDetailExtractor extractor, ByteBuffer pcm, float minBpm, float maxBpm) {
+    try {
+      Method entry =
+          DefaultLocalMusicDetailExtractor.class.getDeclaredMethod(
+              "calculateBeatsInTempoRange",
+              ByteBuffer.class, int.class, int.class, int.class, float.class, float.class);
+      entry.setAccessible(true);
+      return (float[]) entry.invoke(extractor, pcm, pcm.capacity(), 44100, 1, minBpm, maxBpm);
+    } catch (ReflectiveOperationException e) {
+      throw new AssertionError(e);
+    }
   }
 }

@@ -75,13 +75,12 @@ class DefaultLocalMusicDetailExtractorTest {
   }
 
   @Test
-  void successLogsTheTempoAndTheBeatCount() throws Exception {
+  void successLogsTheInputAndTheBeatCount() throws Exception {
     ChildJvm child = ChildJvm.run(BeatScenario.class, "success");
     List<String> log = child.nativeTexts();
     int beats = Integer.parseInt(child.stdout.split("\n")[1]);
     assertTrue(beats > 10, child.stdout);
     assertEquals("Gets " + beats + " beats from APM!", log.get(log.size() - 1));
-    assertTrue(log.contains("Estimated BPM = 120"), log.toString());
     assertTrue(log.contains("Preprocess done. apm input size: 797"), log.toString());
   }
 
@@ -91,9 +90,7 @@ class DefaultLocalMusicDetailExtractorTest {
   @ParameterizedTest
   @CsvSource({"44100, 2, 441", "48000, 1, 480", "22050, 1, 221"})
   void findsTheBeatsOfA120BpmGroove(int sampleRate, int channels, int step) {
-    List<Integer> progress = new ArrayList<>();
-    DefaultLocalMusicDetailExtractor extractor =
-        new DefaultLocalMusicDetailExtractor(p -> !progress.add(p));
+    DefaultLocalMusicDetailExtractor extractor = new DefaultLocalMusicDetailExtractor();
     ByteBuffer pcm = TestTracks.direct(TestTracks.groove(30, sampleRate, channels, 120));
     float[] beats = extractor.calculateBeatsInSec(pcm, pcm.capacity(), sampleRate, channels);
 
@@ -101,12 +98,56 @@ class DefaultLocalMusicDetailExtractorTest {
     double expected = 0.5 * frameRate / Math.floor(frameRate);
     assertEquals(expected, TestTracks.medianInterval(beats), 0.01 * expected);
     for (int i = 1; i < beats.length; i++) assertTrue(beats[i] > beats[i - 1]);
-    assertEquals(0, progress.get(0));
-    assertTrue(progress.contains(33) && progress.contains(66), progress.toString());
-    for (int i = 1; i < progress.size(); i++) {
-      assertTrue(progress.get(i) >= progress.get(i - 1), progress.toString());
+  }
+
+  // The tracker's own range, 75 to 1200 BPM, is its default set-up.
+  @Test
+  void theDefaultRangeGivesTheFourArgumentBeatsAndProgress() {
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(12, 44100, 1, 120));
+    List<Integer> plain = new ArrayList<>();
+    List<Integer> ranged = new ArrayList<>();
+    float[] expected =
+        new DefaultLocalMusicDetailExtractor(p -> !plain.add(p))
+            .calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1);
+    float[] beats =
+        new DefaultLocalMusicDetailExtractor(p -> !ranged.add(p))
+            .calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1, 75, 1200);
+    assertTrue(expected.length > 15);
+    assertArrayEquals(expected, beats);
+    assertEquals(plain, ranged);
+    assertEquals(0, ranged.get(0));
+    assertTrue(ranged.contains(33) && ranged.contains(66), ranged.toString());
+    for (int i = 1; i < ranged.size(); i++) {
+      assertTrue(ranged.get(i) >= ranged.get(i - 1), ranged.toString());
     }
-    assertTrue(progress.get(progress.size() - 1) <= 98);
+    assertTrue(ranged.get(ranged.size() - 1) <= 98);
+
+    DefaultLocalMusicDetailExtractor cancelling = new DefaultLocalMusicDetailExtractor(p -> true);
+    assertEquals(0, cancelling.calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1, 75, 1200).length);
+  }
+
+  // Grooves the default tracks at another metrical level.
+  @ParameterizedTest
+  @CsvSource({"60, 50, 80", "180, 150, 210"})
+  void aRangeHoldsTheTrackerToItsTempo(double bpm, float minBpm, float maxBpm) {
+    ByteBuffer pcm = TestTracks.direct(TestTracks.groove(30, 44100, 1, bpm));
+    DefaultLocalMusicDetailExtractor extractor = new DefaultLocalMusicDetailExtractor();
+    double byDefault = Tempo.precise(extractor.calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1));
+    double inRange =
+        Tempo.precise(extractor.calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1, minBpm, maxBpm));
+    assertTrue(Math.abs(byDefault / bpm - 1) > 0.2, "default " + byDefault);
+    assertEquals(bpm, inRange, 0.005 * bpm);
+  }
+
+  @Test
+  void aBadRangeReachingTheNativeEntryLogsOneErrorAndReturnsNothing() throws Exception {
+    ChildJvm child = ChildJvm.run(BeatScenario.class, "range-refused-natively");
+    assertEquals(
+        List.of(
+            "Refused: tempo range NaN-180 BPM is not a range: both ends must be numbers within"
+                + " 30-1200 BPM."),
+        child.nativeTexts());
+    assertEquals("[]\n0\n", child.stdout);
   }
 
   @Test
