@@ -56,7 +56,7 @@ std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
     return extras.html_path + ": " + error;
   }
   if (!extras.plot_path.empty() &&
-      !WriteTextFile(extras.plot_path, BeatPlotSvg(view), &error)) {
+      !WriteBeatPlot(extras.plot_path, view, &error)) {
     return extras.plot_path + ": " + error;
   }
   if (!extras.html_path.empty() &&

@@ -8,6 +8,7 @@
 #include <vector>
 
 #include "tools/text_escape.h"
+#include "tools/text_file.h"
 
 namespace cwtool {
 namespace {
@@ -145,7 +146,10 @@ std::string Title(const BeatView& view) {
 
 }  // namespace
 
-std::string BeatPlotSvg(const BeatView& view) {
+bool WriteBeatPlot(const std::string& path, const BeatView& view, std::string* error) {
+  // Written as it is drawn: hours of rows make tens of megabytes.
+  TextFile svg;
+  if (!svg.Create(path, error)) return false;
   const double duration = view.duration;
   const int rows = std::max(1, static_cast<int>(std::ceil(duration / kRowSeconds - 1e-9)));
   const int height = static_cast<int>(kFirstRowTop + rows * kRowHeight);
@@ -158,7 +162,7 @@ std::string BeatPlotSvg(const BeatView& view) {
     peak = std::max({peak, -view.envelope_low[i], view.envelope_high[i]});
   }
 
-  std::string svg =
+  svg.Write(
       "<?xml version=\"1.0\" encoding=\"UTF-8\"?>\n"
       "<svg xmlns=\"http://www.w3.org/2000/svg\" width=\"" + std::to_string(kWidth) +
       "\" height=\"" + std::to_string(height) + "\" viewBox=\"0 0 " +
@@ -174,32 +178,33 @@ std::string BeatPlotSvg(const BeatView& view) {
       ".axis text { text-anchor: middle; }\n"
       ".legend { fill: #666; }\n"
       "</style>\n"
-      "<rect width=\"100%\" height=\"100%\" fill=\"white\"/>\n";
-  svg += Format("<text class=\"title\" x=\"%d\" y=\"22\">", kLeft) + Title(view) + "</text>\n";
-  svg += Format("<text class=\"legend\" x=\"%d\" y=\"38\">", kLeft) +
-         "blue: waveform \xC2\xB7 green: onset strength \xC2\xB7 red: beats</text>\n";
+      "<rect width=\"100%\" height=\"100%\" fill=\"white\"/>\n");
+  svg.Write(Format("<text class=\"title\" x=\"%d\" y=\"22\">", kLeft) + Title(view) + "</text>\n");
+  svg.Write(Format("<text class=\"legend\" x=\"%d\" y=\"38\">", kLeft) +
+            "blue: waveform \xC2\xB7 green: onset strength \xC2\xB7 red: beats</text>\n");
 
   const Span whole{0, duration, kPlotWidth};
-  svg += "<g class=\"overview\">\n";
-  svg += Envelope(view, whole, peak, kOverviewTop, kOverviewBottom - 10);
-  svg += BeatMarks(view, whole, kOverviewBottom - 8, kOverviewBottom);
-  svg += TimeAxis(whole, OverviewStep(duration), kOverviewBottom, minutes);
-  svg += "</g>\n";
+  svg.Write("<g class=\"overview\">\n");
+  svg.Write(Envelope(view, whole, peak, kOverviewTop, kOverviewBottom - 10));
+  svg.Write(BeatMarks(view, whole, kOverviewBottom - 8, kOverviewBottom));
+  svg.Write(TimeAxis(whole, OverviewStep(duration), kOverviewBottom, minutes));
+  svg.Write("</g>\n");
 
   for (int r = 0; r < rows; ++r) {
     const double start = r * kRowSeconds;
     const int columns = static_cast<int>(
         std::ceil(kPlotWidth * std::min(1.0, (duration - start) / kRowSeconds)));
     const Span span{start, kRowSeconds, std::max(1, columns)};
-    svg += Format("<g class=\"row\" transform=\"translate(0,%.0f)\">\n",
-                  kFirstRowTop + r * kRowHeight);
-    svg += Envelope(view, span, peak, kWaveTop, kWaveBottom);
-    svg += OnsetLine(view, span, largest_onset);
-    svg += BeatMarks(view, span, kWaveTop, kOnsetBottom);
-    svg += TimeAxis(span, 1, kOnsetBottom, minutes);
-    svg += "</g>\n";
+    svg.Write(Format("<g class=\"row\" transform=\"translate(0,%.0f)\">\n",
+                     kFirstRowTop + r * kRowHeight));
+    svg.Write(Envelope(view, span, peak, kWaveTop, kWaveBottom));
+    svg.Write(OnsetLine(view, span, largest_onset));
+    svg.Write(BeatMarks(view, span, kWaveTop, kOnsetBottom));
+    svg.Write(TimeAxis(span, 1, kOnsetBottom, minutes));
+    svg.Write("</g>\n");
   }
-  return svg + "</svg>\n";
+  svg.Write("</svg>\n");
+  return svg.Commit(error);
 }
 
 }  // namespace cwtool

@@ -10,7 +10,8 @@
 
 namespace cwtool {
 
-std::string BeatPlotSvg(const BeatView& view);
+// On failure *error says why, and nothing is left under path.
+bool WriteBeatPlot(const std::string& path, const BeatView& view, std::string* error);
 
 }  // namespace cwtool
 
