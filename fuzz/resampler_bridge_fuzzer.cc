@@ -7,28 +7,10 @@
 #include <cstring>
 #include <memory>
 
+#include "fuzz/fuzz_reader.h"
 #include "jni/resampler_bridge.h"
 
 namespace {
-
-class Reader {
- public:
-  Reader(const uint8_t* data, size_t size) : data_(data), size_(size) {}
-  bool empty() const { return position_ >= size_; }
-  uint32_t Next(int bytes) {
-    uint32_t value = 0;
-    for (int i = 0; i < bytes; ++i) {
-      value = (value << 8) | (position_ < size_ ? data_[position_] : 0);
-      ++position_;
-    }
-    return value;
-  }
-
- private:
-  const uint8_t* data_;
-  size_t size_;
-  size_t position_ = 0;
-};
 
 // Exactly `size` bytes of heap, so that one byte more is a report; never
 // null, as a Java array's elements are not.
@@ -40,7 +22,7 @@ std::unique_ptr<uint8_t[]> Exact(size_t size) {
 
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
   using resampler_bridge::kContextSize;
-  Reader in(data, size);
+  FuzzReader in(data, size);
   const int32_t channels = static_cast<int32_t>(in.Next(1) % 5) - 1;
   const bool stereo = in.Next(1) % 2;
   const int32_t rate = static_cast<int32_t>(in.Next(4));

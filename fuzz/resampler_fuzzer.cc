@@ -6,33 +6,11 @@
 #include <cstring>
 #include <memory>
 
+#include "fuzz/fuzz_reader.h"
 #include "resampler/audio_resampler.h"
 
-namespace {
-
-class Reader {
- public:
-  Reader(const uint8_t* data, size_t size) : data_(data), size_(size) {}
-  bool empty() const { return position_ >= size_; }
-  uint32_t Next(int bytes) {
-    uint32_t value = 0;
-    for (int i = 0; i < bytes; ++i) {
-      value = (value << 8) | (position_ < size_ ? data_[position_] : 0);
-      ++position_;
-    }
-    return value;
-  }
-
- private:
-  const uint8_t* data_;
-  size_t size_;
-  size_t position_ = 0;
-};
-
-}  // namespace
-
 extern "C" int LLVMFuzzerTestOneInput(const uint8_t* data, size_t size) {
-  Reader in(data, size);
+  FuzzReader in(data, size);
   const int bit_depth = in.Next(1) % 2 == 0 ? 16 : 8;
   const int channels = static_cast<int>(in.Next(1) % 4);
   const int32_t rate = static_cast<int32_t>(in.Next(4));

@@ -274,19 +274,19 @@ const uint8_t* DirectPcm(JNIEnv* env, jobject buffer, jint* size_in_bytes) {
                             : &kNoSamples;
 }
 
-}  // namespace
-
-extern "C" JNIEXPORT jfloatArray JNICALL
-Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtractor_calculateBeatsInSec(
-    JNIEnv* env, jobject receiver, jobject pcm_buffer, jint size_in_bytes,
-    jint sample_rate, jint channel_count) {
-  if (env == nullptr || receiver == nullptr) return nullptr;
+// The analysis behind both entries, which differ only in how the tracker
+// is set up. Callers follow the library's log: the wording of these lines
+// is theirs to rely on, so it stays as the beat entry has always written
+// it.
+jfloatArray BeatsInSec(JNIEnv* env, jobject receiver, jobject pcm_buffer,
+                       jint size_in_bytes, jint sample_rate, jint channel_count,
+                       const apm::ApmConfig& config) {
   const uint8_t* data = DirectPcm(env, pcm_buffer, &size_in_bytes);
   if (data == nullptr) {
     LOG(ERROR) << "The PCM buffer is not a direct buffer: nothing analysed.";
     return env->NewFloatArray(0);
   }
-  apm::AudioAnalyzer analyzer(sample_rate);
+  apm::AudioAnalyzer analyzer(sample_rate, config);
   JavaProgress java_progress(env, receiver);
   int32_t n = analyzer.CalculateBeats(
       data, size_in_bytes, channel_count,
@@ -303,6 +303,17 @@ Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtr
   return beats;
 }
 
+}  // namespace
+
+extern "C" JNIEXPORT jfloatArray JNICALL
+Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtractor_calculateBeatsInSec(
+    JNIEnv* env, jobject receiver, jobject pcm_buffer, jint size_in_bytes,
+    jint sample_rate, jint channel_count) {
+  if (env == nullptr || receiver == nullptr) return nullptr;
+  return BeatsInSec(env, receiver, pcm_buffer, size_in_bytes, sample_rate,
+                    channel_count, apm::ApmConfig());
+}
+
 // The same analysis with the tracker held to a tempo range. The Java side
 // checks the range first; one reaching here anyway is refused before any
 // work.
@@ -317,25 +328,6 @@ Java_com_quilby_norvane_apps_clipweaver_music_detail_DefaultLocalMusicDetailExtr
     LOG(ERROR) << "Refused: " << range_error << ".";
     return env->NewFloatArray(0);
   }
-  const uint8_t* data = DirectPcm(env, pcm_buffer, &size_in_bytes);
-  if (data == nullptr) {
-    LOG(ERROR) << "The PCM buffer is not a direct buffer: nothing analysed.";
-    return env->NewFloatArray(0);
-  }
-  apm::AudioAnalyzer analyzer(sample_rate,
-                              apm::ConfigForTempoRange(min_bpm, max_bpm));
-  JavaProgress java_progress(env, receiver);
-  int32_t n = analyzer.CalculateBeats(
-      data, size_in_bytes, channel_count,
-      [&java_progress](char progress) { return java_progress(progress); });
-  if (n < 0) {
-    LOG(ERROR) << "Failed to retrieve beats from APM!";
-    n = 0;
-  }
-  LOG(INFO) << "Gets " << n << " beats from APM!";
-  if (java_progress.threw()) return nullptr;
-  jfloatArray beats = env->NewFloatArray(n);
-  if (beats == nullptr) return nullptr;
-  if (n > 0) env->SetFloatArrayRegion(beats, 0, n, analyzer.beats());
-  return beats;
+  return BeatsInSec(env, receiver, pcm_buffer, size_in_bytes, sample_rate,
+                    channel_count, apm::ConfigForTempoRange(min_bpm, max_bpm));
 }
