@@ -3,12 +3,15 @@ leaves every file as it was, memory stays bounded whatever the ratio, and
 what a file's header hides or its name holds is told plainly."""
 import hashlib
 import os
+import resource
 import signal
+import subprocess
 import time
 import unittest
 import wave
 
-from tool_harness import example, main, path, read_wav, run, start
+import tool_harness
+from tool_harness import example, limit_memory, main, path, read_wav, run, start
 
 
 def digest(name):
@@ -92,6 +95,28 @@ class DataSafety(unittest.TestCase):
                 self.assertEqual(listing(), files)
                 self.assertEqual(os.listdir(path('sub')), kept_in_sub)
                 self.assertEqual(digest('kept.wav'), kept)
+
+    def test_outputs_past_the_file_size_limit_are_refused_and_left_out(self):
+        example('groove.wav')
+
+        def limited():
+            limit_memory()()
+            signal.signal(signal.SIGXFSZ, signal.SIG_IGN)
+            resource.setrlimit(resource.RLIMIT_FSIZE, (80_000, 80_000))
+
+        # The plot (94 kB) fails after a first buffered write went through.
+        for option, name in (('--plot', 'big.svg'), ('--html', 'big.html'),
+                             ('--click', 'big.wav')):
+            with self.subTest(option):
+                files = listing()
+                done = subprocess.run(
+                    [tool_harness.TOOL, 'beats', 'groove.wav', option, name], cwd=path('.'),
+                    capture_output=True, text=True, timeout=60, preexec_fn=limited)
+                self.assertEqual((done.returncode, done.stderr), (1, (
+                    f'clipweaver: groove.wav: {name}: cannot write: '
+                    'file too large for this file system\n')))
+                self.assertTrue(done.stdout.startswith('groove.wav: 120.02 BPM'))
+                self.assertEqual(listing(), files)
 
     def test_truncated_file_is_analysed_with_a_warning(self):
         with open(example('ten.wav', seconds=10, channels=1), 'rb') as f:
