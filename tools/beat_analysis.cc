@@ -14,7 +14,6 @@
 #include "tools/html_page.h"
 #include "tools/interrupt.h"
 #include "tools/svg_plot.h"
-#include "tools/text_file.h"
 
 namespace cwtool {
 namespace {
@@ -60,7 +59,7 @@ std::string WriteExtras(const ExtraOutputs& extras, BeatViewSignal* signal,
     return extras.plot_path + ": " + error;
   }
   if (!extras.html_path.empty() &&
-      !WriteTextFile(extras.html_path, BeatPageHtml(view), &error)) {
+      !WriteBeatPage(extras.html_path, view, &error)) {
     return extras.html_path + ": " + error;
   }
   return std::string();

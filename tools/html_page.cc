@@ -3,9 +3,11 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdio>
+#include <string_view>
 
 #include "tools/html_template.h"
 #include "tools/text_escape.h"
+#include "tools/text_file.h"
 
 namespace cwtool {
 namespace {
@@ -61,7 +63,7 @@ std::string DataJson(const BeatView& view) {
   return safe;
 }
 
-std::string Base64(const std::string& bytes) {
+std::string Base64(std::string_view bytes) {
   static constexpr char kDigits[] =
       "ABCDEFGHIJKLMNOPQRSTUVWXYZabcdefghijklmnopqrstuvwxyz0123456789+/";
   std::string out;
@@ -79,27 +81,39 @@ std::string Base64(const std::string& bytes) {
   return out;
 }
 
-// Fills the first placeholder after *from and moves *from past the value,
-// so that a value is never searched for later placeholders.
-void Fill(std::string* text, size_t* from, const std::string& placeholder,
-          const std::string& value) {
-  const size_t at = text->find(placeholder, *from);
-  if (at == std::string::npos) return;
-  text->replace(at, placeholder.size(), value);
-  *from = at + value.size();
+// In pieces of whole 3-byte groups, which encode as the whole does, so that
+// the encoded audio (tens of megabytes on hours) is never held.
+void WriteBase64(std::string_view bytes, TextFile* out) {
+  constexpr size_t kPiece = 3 << 14;
+  for (size_t at = 0; at < bytes.size(); at += kPiece) {
+    out->Write(Base64(bytes.substr(at, kPiece)));
+  }
 }
 
 }  // namespace
 
-std::string BeatPageHtml(const BeatView& view) {
-  std::string page(kHtmlTemplate);
-  size_t from = 0;
-  Fill(&page, &from, "{{title}}", XmlText(view.file));
-  Fill(&page, &from, "{{audio}}",
-       view.audio.empty() ? std::string()
-                          : "data:" + view.audio_mime + ";base64," + Base64(view.audio));
-  Fill(&page, &from, "{{data}}", DataJson(view));
-  return page;
+bool WriteBeatPage(const std::string& path, const BeatView& view, std::string* error) {
+  TextFile page;
+  if (!page.Create(path, error)) return false;
+  // Values go out in their placeholders' places, never searched for later
+  // placeholders.
+  std::string_view rest = kHtmlTemplate;
+  const auto fill = [&](std::string_view placeholder, const auto& write_value) {
+    const size_t at = rest.find(placeholder);
+    if (at == std::string_view::npos) return;
+    page.Write(rest.substr(0, at));
+    write_value();
+    rest.remove_prefix(at + placeholder.size());
+  };
+  fill("{{title}}", [&] { page.Write(XmlText(view.file)); });
+  fill("{{audio}}", [&] {
+    if (view.audio.empty()) return;
+    page.Write("data:" + view.audio_mime + ";base64,");
+    WriteBase64(view.audio, &page);
+  });
+  fill("{{data}}", [&] { page.Write(DataJson(view)); });
+  page.Write(rest);
+  return page.Commit(error);
 }
 
 }  // namespace cwtool

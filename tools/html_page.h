@@ -9,7 +9,9 @@
 
 namespace cwtool {
 
-std::string BeatPageHtml(const BeatView& view);
+// Written as it is made; on failure *error says why, and nothing is left
+// under path.
+bool WriteBeatPage(const std::string& path, const BeatView& view, std::string* error);
 
 }  // namespace cwtool
 

@@ -52,12 +52,4 @@ bool TextFile::Commit(std::string* error) {
   return file_.Commit(error);
 }
 
-bool WriteTextFile(const std::string& path, const std::string& text,
-                   std::string* error) {
-  TextFile file;
-  if (!file.Create(path, error)) return false;
-  file.Write(text);
-  return file.Commit(error);
-}
-
 }  // namespace cwtool

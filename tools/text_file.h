@@ -1,5 +1,5 @@
-// Writing a generated document (plot, page), whole or piece by piece as it
-// is made, so that a large one need not be held in memory.
+// A generated document (plot, page) written piece by piece as it is made,
+// so that a large one is never held in memory.
 #ifndef CLIPWEAVER_TOOLS_TEXT_FILE_H_
 #define CLIPWEAVER_TOOLS_TEXT_FILE_H_
 
@@ -26,10 +26,6 @@ class TextFile {
   std::string buffer_;
   int errno_ = 0;
 };
-
-// On failure *error reads "cannot write: <reason>".
-bool WriteTextFile(const std::string& path, const std::string& text,
-                   std::string* error);
 
 }  // namespace cwtool
 
