@@ -32,6 +32,9 @@ constexpr OptionSpec kOptions[] = {
     {kBeatsCommand, "jobs", 'j', "N",
      "analyse N files at a time (default: one per core); the\n"
      "results still come in the order of the arguments"},
+    {kBeatsCommand, "tempo", 0, "MIN-MAX",
+     "only look for tempi from MIN to MAX BPM (within 30-1200),\n"
+     "e.g. 150-210 where the default finds half or 2/3 time"},
     {kBeatsCommand, "click", 0, "OUT",
      "also write the input mixed with a click on every beat"},
     {kBeatsCommand, "plot", 0, "OUT.svg",
@@ -42,9 +45,6 @@ constexpr OptionSpec kOptions[] = {
      "beats (zoom, seek, a click on every beat), usable offline\n"
      "With several files OUT must hold '{}', which stands for\n"
      "each input's name without directory and extension."},
-    {kBeatsCommand, "tempo", 0, "MIN-MAX",
-     "only look for tempi from MIN to MAX BPM (within 30-1200),\n"
-     "e.g. 150-210 where the default finds half or 2/3 time"},
     {kBeatsCommand, "quiet", 'q', nullptr,
      "no progress bar (it is only drawn when stderr is a terminal)"},
     {kBeatsCommand, "verbose", 'v', nullptr,

@@ -16,7 +16,7 @@ class HelpAndVersion(unittest.TestCase):
                 done = run(*args)
                 self.assertEqual(done.returncode, 0)
                 for option in ('--format', '--jobs', '--quiet', '--verbose',
-                               '--click', '--plot', '--html', '--rate', '--gain', '--bpm',
+                               '--tempo', '--click', '--plot', '--html', '--rate', '--gain', '--bpm',
                                '--seconds', '--channels', '--version'):
                     self.assertIn(option, done.stdout)
                 self.assertIn('\nExamples:\n  clipweaver ', done.stdout)
