@@ -3,6 +3,7 @@
 // the beats must then come out the same on every target and compiler too.
 #include <gtest/gtest.h>
 
+#include <algorithm>
 #include <cinttypes>
 #include <cstdio>
 #include <cstring>
@@ -11,40 +12,15 @@
 #include <vector>
 
 #include "jni/apm/audio_analyzer.h"
+#include "tests/test_signals.h"
 
 namespace apm {
 namespace {
 
-// Numerical Recipes' LCG; the high half is the noise sample.
-class Noise {
- public:
-  explicit Noise(uint32_t seed) : state_(seed) {}
-  int32_t Next() {
-    state_ = state_ * 1664525u + 1013904223u;
-    return static_cast<int32_t>(state_ >> 16) - 32768;
-  }
-
- private:
-  uint32_t state_;
-};
-
-// Triangle wave from a 32-bit phase accumulator, in -32768..32767.
-int32_t Triangle(uint32_t phase) {
-  const int32_t ramp = static_cast<int32_t>(phase >> 15);  // 0..131071
-  return (ramp < 65536 ? ramp : 131071 - ramp) - 32768;
-}
-
-uint32_t PhaseStep(int32_t hertz, int32_t sample_rate) {
-  return static_cast<uint32_t>((static_cast<uint64_t>(hertz) << 32) /
-                               static_cast<uint64_t>(sample_rate));
-}
-
-// (remaining / length)^2 in 1/65536ths: a percussive decay.
-int64_t Decay(int64_t since, int64_t length) {
-  if (since < 0 || since >= length) return 0;
-  const int64_t remaining = length - since;
-  return remaining * remaining * 65536 / (length * length);
-}
+using test_signals::Decay;
+using test_signals::Noise;
+using test_signals::PhaseStep;
+using test_signals::Triangle;
 
 struct Groove {
   const char* name;
@@ -56,6 +32,12 @@ struct Groove {
   bool kick;   // low thump with a noise attack on every beat
   bool hats;   // short noise bursts half way between beats
   bool notes;  // a triangle-wave note from every beat, pitch cycling per bar
+  // A sustained chord per bar, fading in over a beat as the last one fades
+  // out, with a slight swell on every beat: weak onsets, many near ties.
+  bool strings;
+  // Soft notes with a 5 ms attack ringing over two beats, resting on every
+  // eighth beat.
+  bool piano;
   uint64_t detection_fingerprint;
   std::vector<uint32_t> beat_bits;  // beat times as float bits
 };
@@ -106,6 +88,38 @@ std::vector<uint8_t> Synthesise(const Groove& g) {
       left += tone;
       right += tone;
       note_phase += PhaseStep(kNoteHertz[(beat / 4) % 4], g.sample_rate);
+    }
+    if (g.strings) {
+      static const int32_t kChords[4][3] = {
+          {220, 277, 330}, {196, 247, 294}, {175, 220, 262}, {196, 247, 294}};
+      const int64_t bar_start = (beat / 4) * 4 * rate * 60 / g.bpm;
+      const int64_t rise = std::min(i - bar_start, beat_length) * 65536 / beat_length;
+      const auto chord = [&](int64_t bar) {
+        int64_t sum = 0;
+        for (int32_t hertz : kChords[bar % 4]) {
+          sum += Triangle(static_cast<uint32_t>(i) * PhaseStep(hertz, g.sample_rate));
+        }
+        return sum / 3;
+      };
+      const int64_t bow = 65536 + Decay(since, beat_length / 2) / 4;
+      const int64_t tone =
+          (chord(beat / 4) * rise + chord(beat / 4 + 3) * (65536 - rise)) / 65536;
+      left += tone * bow / 65536 / 4;
+      right += tone * bow / 65536 / 5;
+    }
+    if (g.piano) {
+      static const int32_t kPianoHertz[8] = {262, 330, 392, 330, 294, 349, 440, 0};
+      const int64_t attack = rate / 200;
+      for (int64_t back = 0; back < 2 && back <= beat; ++back) {
+        const int32_t hertz = kPianoHertz[(beat - back) % 8];
+        const int64_t from = (beat - back) * rate * 60 / g.bpm;
+        const int64_t at = i - from;
+        if (hertz == 0) continue;
+        const int64_t note = Triangle(static_cast<uint32_t>(at) * PhaseStep(hertz, g.sample_rate)) *
+                             Decay(at, 2 * beat_length) / 65536 * std::min(at, attack) / attack;
+        left += note / 10;
+        right += note / 10;
+      }
     }
     kick_phase += kick_step;
     const int64_t mono = (left + right) / 2;
@@ -177,7 +191,7 @@ TEST_P(GoldenBeats, MatchBitForBit) {
 }
 
 const Groove kGrooves[] = {
-    {"Kick120Mono44k", 44100, 1, 6, 120, 1, true, true, false,
+    {"Kick120Mono44k", 44100, 1, 6, 120, 1, true, true, false, false, false,
      0xb3afc557d80a0259u,
      {
       0x00000000,  // 0
@@ -193,7 +207,7 @@ const Groove kGrooves[] = {
       0x409f5c29,  // 4.98000002
       0x40af5c29,  // 5.48000002
      }},
-    {"Band100Stereo22k", 22050, 2, 8, 100, 2, true, true, true,
+    {"Band100Stereo22k", 22050, 2, 8, 100, 2, true, true, true, false, false,
      0x9fb801a1efc3f9c9u,
      {
       0x00000000,  // 0
@@ -211,7 +225,7 @@ const Groove kGrooves[] = {
       0x40e7c1f0,  // 7.24242401
       0x40fb26ca,  // 7.84848499
      }},
-    {"Notes140Mono8k", 8000, 1, 10, 140, 3, false, false, true,
+    {"Notes140Mono8k", 8000, 1, 10, 140, 3, false, false, true, false, false,
      0x7e2ff2e6ca4b79acu,
      {
       0x00000000,  // 0
@@ -239,7 +253,7 @@ const Groove kGrooves[] = {
       0x4116e148,  // 9.43000031
       0x411dc28f,  // 9.85999966
      }},
-    {"Kick87Stereo16k", 16000, 2, 7, 87, 4, true, false, true,
+    {"Kick87Stereo16k", 16000, 2, 7, 87, 4, true, false, true, false, false,
      0x6d8f203f6bb82e0cu,
      {
       0x00000000,  // 0
@@ -253,6 +267,52 @@ const Groove kGrooves[] = {
       0x40b00000,  // 5.5
       0x40c6147b,  // 6.19000006
       0x40dc28f6,  // 6.88000011
+     }},
+    {"Strings110Stereo44k", 44100, 2, 12, 110, 5, false, false, false, true, false,
+     0x0b85428081268cd1u,
+     {
+      0x00000000,  // 0
+      0x3f0ccccd,  // 0.550000012
+      0x3f8ccccd,  // 1.10000002
+      0x3fd33333,  // 1.64999998
+      0x400ccccd,  // 2.20000005
+      0x40300000,  // 2.75
+      0x40533333,  // 3.29999995
+      0x40766666,  // 3.8499999
+      0x408ccccd,  // 4.4000001
+      0x409e6666,  // 4.94999981
+      0x40b00000,  // 5.5
+      0x40c1999a,  // 6.05000019
+      0x40d33333,  // 6.5999999
+      0x40e4cccd,  // 7.1500001
+      0x40f66666,  // 7.69999981
+      0x41040000,  // 8.25
+      0x410ccccd,  // 8.80000019
+      0x4115999a,  // 9.35000038
+      0x411e6666,  // 9.89999962
+      0x41273333,  // 10.4499998
+      0x41300000,  // 11
+      0x4138cccd,  // 11.5500002
+     }},
+    {"SoftPiano96Mono22k", 22050, 1, 10, 96, 6, false, false, false, false, true,
+     0x52670d84b00e5fabu,
+     {
+      0x00000000,  // 0
+      0x3f2052bf,  // 0.626262605
+      0x3fa052bf,  // 1.25252521
+      0x3ff07c1f,  // 1.87878788
+      0x402052bf,  // 2.50505042
+      0x4048676f,  // 3.13131309
+      0x40707c1f,  // 3.75757575
+      0x408c4867,  // 4.38383818
+      0x40a052bf,  // 5.01010084
+      0x40b45d17,  // 5.63636351
+      0x40c90cee,  // 6.28282833
+      0x40dd6a05,  // 6.91919184
+      0x40f1c71c,  // 7.55555534
+      0x4103121a,  // 8.19191933
+      0x410d40a5,  // 8.82828236
+      0x41176f31,  // 9.46464634
      }},
 };
 
