@@ -1,6 +1,9 @@
 // Beat times of a few synthesised grooves, fixed to the bit. The grooves are
 // made with integer arithmetic only, so the input is the same everywhere;
 // the beats must then come out the same on every target and compiler too.
+// Synthesise is the recipe of the goldens: a failure prints the listing to
+// paste after an intended change. The string and soft piano grooves have
+// weak onsets and many near ties in the beam.
 #include <gtest/gtest.h>
 
 #include <algorithm>
@@ -137,16 +140,13 @@ std::vector<uint8_t> Synthesise(const Groove& g) {
 
 void PrintTo(const Groove& g, std::ostream* out) { *out << g.name; }
 
-// One line per beat: its bits and, for reading, its value.
+// Six beats a line, as the goldens below are written.
 std::string Listing(const std::vector<uint32_t>& bits) {
   std::string text;
-  for (uint32_t b : bits) {
-    float seconds;
-    std::memcpy(&seconds, &b, sizeof seconds);
-    char line[48];
-    std::snprintf(line, sizeof line, "0x%08" PRIx32 ",  // %.9g\n", b,
-                  static_cast<double>(seconds));
-    text += line;
+  for (size_t i = 0; i < bits.size(); ++i) {
+    char value[16];
+    std::snprintf(value, sizeof value, "0x%08" PRIx32 ",", bits[i]);
+    text += (i % 6 == 0 ? "      " : " ") + std::string(value) + (i % 6 == 5 ? "\n" : "");
   }
   return text;
 }
@@ -180,8 +180,9 @@ TEST_P(GoldenBeats, MatchBitForBit) {
   ASSERT_GE(count, 0);
   std::vector<uint32_t> bits(static_cast<size_t>(count));
   if (count > 0) std::memcpy(bits.data(), analyzer.beats(), bits.size() * 4);
-  const std::string beats = Listing(bits);
-  EXPECT_EQ(Listing(g.beat_bits), beats) << "Beats now:\n" << beats;
+  EXPECT_EQ(g.beat_bits, bits) << "Beats now:\n" << Listing(bits) << "\nin seconds: "
+                               << testing::PrintToString(std::vector<float>(
+                                      analyzer.beats(), analyzer.beats() + count));
   // Tells whether a difference starts before the tracker.
   EXPECT_EQ(Hex(g.detection_fingerprint),
             Hex(Fingerprint(analyzer.detection_function())))
@@ -194,125 +195,44 @@ const Groove kGrooves[] = {
     {"Kick120Mono44k", 44100, 1, 6, 120, 1, true, true, false, false, false,
      0xb3afc557d80a0259u,
      {
-      0x00000000,  // 0
-      0x3efae148,  // 0.49000001
-      0x3f7ae148,  // 0.980000019
-      0x3fbc28f6,  // 1.47000003
-      0x3ffd70a4,  // 1.98000002
-      0x401eb852,  // 2.48000002
-      0x403eb852,  // 2.98000002
-      0x405eb852,  // 3.48000002
-      0x407eb852,  // 3.98000002
-      0x408f5c29,  // 4.48000002
-      0x409f5c29,  // 4.98000002
-      0x40af5c29,  // 5.48000002
+      0x00000000, 0x3efae148, 0x3f7ae148, 0x3fbc28f6, 0x3ffd70a4, 0x401eb852,
+      0x403eb852, 0x405eb852, 0x407eb852, 0x408f5c29, 0x409f5c29, 0x40af5c29,
      }},
     {"Band100Stereo22k", 22050, 2, 8, 100, 2, true, true, true, false, false,
      0x9fb801a1efc3f9c9u,
      {
-      0x00000000,  // 0
-      0x3f1890cf,  // 0.595959604
-      0x3f9890cf,  // 1.19191921
-      0x3fe4d936,  // 1.78787875
-      0x401890cf,  // 2.38383842
-      0x40400000,  // 3
-      0x4066c9b2,  // 3.6060605
-      0x4086c9b2,  // 4.21212101
-      0x409a2e8c,  // 4.81818199
-      0x40ad9365,  // 5.4242425
-      0x40c0f83e,  // 6.030303
-      0x40d45d17,  // 6.63636351
-      0x40e7c1f0,  // 7.24242401
-      0x40fb26ca,  // 7.84848499
+      0x00000000, 0x3f1890cf, 0x3f9890cf, 0x3fe4d936, 0x401890cf, 0x40400000,
+      0x4066c9b2, 0x4086c9b2, 0x409a2e8c, 0x40ad9365, 0x40c0f83e, 0x40d45d17,
+      0x40e7c1f0, 0x40fb26ca,
      }},
     {"Notes140Mono8k", 8000, 1, 10, 140, 3, false, false, true, false, false,
      0x7e2ff2e6ca4b79acu,
      {
-      0x00000000,  // 0
-      0x3ed70a3d,  // 0.419999987
-      0x3f570a3d,  // 0.839999974
-      0x3fa147ae,  // 1.25999999
-      0x3fd70a3d,  // 1.67999995
-      0x4007ae14,  // 2.11999989
-      0x40233333,  // 2.54999995
-      0x403eb852,  // 2.98000002
-      0x405a3d71,  // 3.41000009
-      0x4075c28f,  // 3.83999991
-      0x4088a3d7,  // 4.26999998
-      0x40966666,  // 4.69999981
-      0x40a428f6,  // 5.13000011
-      0x40b1eb85,  // 5.55999994
-      0x40bfae14,  // 5.98999977
-      0x40cd70a4,  // 6.42000008
-      0x40db3333,  // 6.8499999
-      0x40e8f5c3,  // 7.28000021
-      0x40f6b852,  // 7.71000004
-      0x41023d71,  // 8.14000034
-      0x41091eb8,  // 8.56999969
-      0x41100000,  // 9
-      0x4116e148,  // 9.43000031
-      0x411dc28f,  // 9.85999966
+      0x00000000, 0x3ed70a3d, 0x3f570a3d, 0x3fa147ae, 0x3fd70a3d, 0x4007ae14,
+      0x40233333, 0x403eb852, 0x405a3d71, 0x4075c28f, 0x4088a3d7, 0x40966666,
+      0x40a428f6, 0x40b1eb85, 0x40bfae14, 0x40cd70a4, 0x40db3333, 0x40e8f5c3,
+      0x40f6b852, 0x41023d71, 0x41091eb8, 0x41100000, 0x4116e148, 0x411dc28f,
      }},
     {"Kick87Stereo16k", 16000, 2, 7, 87, 4, true, false, true, false, false,
      0x6d8f203f6bb82e0cu,
      {
-      0x00000000,  // 0
-      0x3f2e147b,  // 0.680000007
-      0x3fae147b,  // 1.36000001
-      0x40028f5c,  // 2.03999996
-      0x402f5c29,  // 2.74000001
-      0x405b851f,  // 3.43000007
-      0x4083d70a,  // 4.11999989
-      0x4099eb85,  // 4.80999994
-      0x40b00000,  // 5.5
-      0x40c6147b,  // 6.19000006
-      0x40dc28f6,  // 6.88000011
+      0x00000000, 0x3f2e147b, 0x3fae147b, 0x40028f5c, 0x402f5c29, 0x405b851f,
+      0x4083d70a, 0x4099eb85, 0x40b00000, 0x40c6147b, 0x40dc28f6,
      }},
     {"Strings110Stereo44k", 44100, 2, 12, 110, 5, false, false, false, true, false,
      0x0b85428081268cd1u,
      {
-      0x00000000,  // 0
-      0x3f0ccccd,  // 0.550000012
-      0x3f8ccccd,  // 1.10000002
-      0x3fd33333,  // 1.64999998
-      0x400ccccd,  // 2.20000005
-      0x40300000,  // 2.75
-      0x40533333,  // 3.29999995
-      0x40766666,  // 3.8499999
-      0x408ccccd,  // 4.4000001
-      0x409e6666,  // 4.94999981
-      0x40b00000,  // 5.5
-      0x40c1999a,  // 6.05000019
-      0x40d33333,  // 6.5999999
-      0x40e4cccd,  // 7.1500001
-      0x40f66666,  // 7.69999981
-      0x41040000,  // 8.25
-      0x410ccccd,  // 8.80000019
-      0x4115999a,  // 9.35000038
-      0x411e6666,  // 9.89999962
-      0x41273333,  // 10.4499998
-      0x41300000,  // 11
-      0x4138cccd,  // 11.5500002
+      0x00000000, 0x3f0ccccd, 0x3f8ccccd, 0x3fd33333, 0x400ccccd, 0x40300000,
+      0x40533333, 0x40766666, 0x408ccccd, 0x409e6666, 0x40b00000, 0x40c1999a,
+      0x40d33333, 0x40e4cccd, 0x40f66666, 0x41040000, 0x410ccccd, 0x4115999a,
+      0x411e6666, 0x41273333, 0x41300000, 0x4138cccd,
      }},
     {"SoftPiano96Mono22k", 22050, 1, 10, 96, 6, false, false, false, false, true,
      0x52670d84b00e5fabu,
      {
-      0x00000000,  // 0
-      0x3f2052bf,  // 0.626262605
-      0x3fa052bf,  // 1.25252521
-      0x3ff07c1f,  // 1.87878788
-      0x402052bf,  // 2.50505042
-      0x4048676f,  // 3.13131309
-      0x40707c1f,  // 3.75757575
-      0x408c4867,  // 4.38383818
-      0x40a052bf,  // 5.01010084
-      0x40b45d17,  // 5.63636351
-      0x40c90cee,  // 6.28282833
-      0x40dd6a05,  // 6.91919184
-      0x40f1c71c,  // 7.55555534
-      0x4103121a,  // 8.19191933
-      0x410d40a5,  // 8.82828236
-      0x41176f31,  // 9.46464634
+      0x00000000, 0x3f2052bf, 0x3fa052bf, 0x3ff07c1f, 0x402052bf, 0x4048676f,
+      0x40707c1f, 0x408c4867, 0x40a052bf, 0x40b45d17, 0x40c90cee, 0x40dd6a05,
+      0x40f1c71c, 0x4103121a, 0x410d40a5, 0x41176f31,
      }},
 };
 
