@@ -95,8 +95,9 @@ path = os.path.join(out, "memory.txt")
 if os.path.exists(path):
     with open(path) as f:
         for line in f:
-            minutes, pcm, native, _ = line.split()
-            rows.append((f"native memory, {minutes} min stereo", f"{native} MiB", f"beside {pcm} MiB of PCM"))
+            minutes, kind, native, per_second, _ = line.split()
+            rows.append((f"native memory, {minutes} min stereo {kind}, streamed", f"{native} MiB",
+                         f"{per_second} KiB per second of audio"))
 
 print(f"Measured on {cpu_model()}, {os.cpu_count()} cores; medians of 5 runs.\n")
 print("| measure | value | comparison |")

@@ -5,7 +5,6 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
-#include <cstring>
 
 #include "base/logging.h"
 #include "jni/apm/analysis_frame_rate.h"

@@ -7,7 +7,7 @@ namespace {
 
 // Frames between merge checks at least; a check walks back over the kept
 // rows, so with a long undecided stretch they come further apart.
-constexpr int32_t kCheckInterval = 256;
+constexpr int32_t kCheckInterval = 512;
 
 }  // namespace
 
@@ -23,6 +23,9 @@ void BeamHistory::Reset(int32_t width, int32_t frame_count,
   path_.assign(frame_count, 0);
   broken_.clear();
   position_.assign(static_cast<size_t>(kNoPredecessor) + 1, -1);
+  // One more, for -1.
+  way_mark_.assign(static_cast<size_t>(kNoPredecessor) + 2, 0);
+  generation_ = 0;
 }
 
 const uint16_t* BeamHistory::states(int32_t t) const {
@@ -34,14 +37,17 @@ const uint16_t* BeamHistory::predecessors(int32_t t) const {
 }
 
 void BeamHistory::Append(const int32_t* beam, const int32_t* predecessor) {
+  ++last_row_;
+  states_.resize(states_.size() + width_);
+  predecessors_.resize(predecessors_.size() + width_);
+  uint16_t* row = states_.data() + states_.size() - width_;
+  uint16_t* from = predecessors_.data() + predecessors_.size() - width_;
   for (int32_t k = 0; k < width_; ++k) {
     const int32_t s = beam[k];
-    states_.push_back(static_cast<uint16_t>(s));
-    predecessors_.push_back(predecessor[s] == -1
-                                ? kNoPredecessor
-                                : static_cast<uint16_t>(predecessor[s]));
+    row[k] = static_cast<uint16_t>(s);
+    from[k] = predecessor[s] == -1 ? kNoPredecessor
+                                   : static_cast<uint16_t>(predecessor[s]);
   }
-  ++last_row_;
   const int32_t undecided = last_row_ - decided_;
   if (!keep_every_row_ &&
       last_row_ - last_check_ >= std::max(kCheckInterval, undecided / 2)) {
@@ -70,6 +76,21 @@ bool BeamHistory::WasBroken(int32_t t) const {
   return std::binary_search(broken_.begin(), broken_.end(), t);
 }
 
+void BeamHistory::NextGeneration() {
+  if (++generation_ == 0) {
+    std::fill(way_mark_.begin(), way_mark_.end(), 0);
+    generation_ = 1;
+  }
+}
+
+void BeamHistory::AddWay(int32_t state, std::vector<int32_t>* ways) {
+  uint32_t& mark = way_mark_[static_cast<size_t>(state + 1)];
+  if (mark != generation_) {
+    mark = generation_;
+    ways->push_back(state);
+  }
+}
+
 int32_t BeamHistory::StepBack(int32_t t, int32_t s) const {
   const int32_t k = s == -1 || position_[s] == -1 ? width_ - 1 : position_[s];
   const uint16_t predecessor = predecessors(t)[k];
@@ -80,14 +101,13 @@ int32_t BeamHistory::StepBack(int32_t t, int32_t s) const {
 // it in the predecessor of one of the row's entries; those ways back are
 // followed down until they meet.
 void BeamHistory::CheckForMerge() {
+  NextGeneration();
   ways_.clear();
   const uint16_t* newest = predecessors(last_row_);
   for (int32_t k = 0; k < width_; ++k) {
-    ways_.push_back(newest[k] == kNoPredecessor ? -1 : newest[k]);
+    AddWay(newest[k] == kNoPredecessor ? -1 : newest[k], &ways_);
   }
   for (int32_t t = last_row_ - 1; t > decided_; --t) {
-    std::sort(ways_.begin(), ways_.end());
-    ways_.erase(std::unique(ways_.begin(), ways_.end()), ways_.end());
     if (ways_.size() == 1) {
       Settle(t, ways_[0]);
       return;
@@ -95,8 +115,9 @@ void BeamHistory::CheckForMerge() {
     const uint16_t* row = states(t);
     // Backwards, so that a state found twice keeps its first position.
     for (int32_t k = width_ - 1; k >= 0; --k) position_[row[k]] = k;
+    NextGeneration();
     next_ways_.clear();
-    for (const int32_t s : ways_) next_ways_.push_back(StepBack(t, s));
+    for (const int32_t s : ways_) AddWay(StepBack(t, s), &next_ways_);
     for (int32_t k = 0; k < width_; ++k) position_[row[k]] = -1;
     ways_.swap(next_ways_);
   }

@@ -9,11 +9,11 @@
 // remembered and reported by the final backtrack in their usual order.
 //
 // How deep merges lie, at 100 frames a second: on a 120 BPM pulse over
-// noise the ways back meet 4.0 to 4.6 seconds behind the newest frame, so a
-// few hundred rows are kept whatever the length. On near-silence (the noise
-// alone) they meet only every minute or two, 68 to 179 seconds back in ten
-// minutes: those rows are kept until then, as there is nothing to decide
-// the path by.
+// noise the ways back meet 4.0 to 4.6 seconds behind the newest frame, so
+// with a check every 512 frames about a thousand rows are kept whatever the
+// length. On near-silence (the noise alone) they meet only every minute or
+// two, 68 to 179 seconds back in ten minutes: those rows are kept until
+// then, as there is nothing to decide the path by.
 #ifndef CLIPWEAVER_JNI_APM_BEAM_HISTORY_H_
 #define CLIPWEAVER_JNI_APM_BEAM_HISTORY_H_
 
@@ -56,6 +56,9 @@ class BeamHistory {
   const uint16_t* predecessors(int32_t t) const;
   // The state before a way back that enters row t in state s.
   int32_t StepBack(int32_t t, int32_t s) const;
+  void NextGeneration();
+  // Adds state to ways unless it was added since the last NextGeneration.
+  void AddWay(int32_t state, std::vector<int32_t>* ways);
   void CheckForMerge();
   void Settle(int32_t merge_row, int32_t state);
 
@@ -76,6 +79,8 @@ class BeamHistory {
   std::vector<int32_t> position_;
   std::vector<int32_t> ways_;
   std::vector<int32_t> next_ways_;
+  std::vector<uint32_t> way_mark_;
+  uint32_t generation_ = 0;
 };
 
 }  // namespace apm

@@ -18,17 +18,22 @@ void CombBank::Reset(const std::vector<int32_t>& lag_frames,
 
 const double* CombBank::Filter(const std::vector<float>& detection,
                                int32_t t) {
+  // Locals, so that the stores to the outputs need not reload them.
+  const double weight = input_weight_;
+  const double start = start_factor_;
+  const int32_t* lags = lag_frames_.data();
+  const size_t count = lag_frames_.size();
   const float x = detection[t];
   double* out = row(t);
-  for (size_t i = 0; i < lag_frames_.size(); ++i) {
-    const int32_t back = t - lag_frames_[i];
+  for (size_t i = 0; i < count; ++i) {
+    const int32_t back = t - lags[i];
     float product = back >= 0 ? detection[back] * x
-                              : static_cast<float>(start_factor_ * x);
-    if (input_weight_ < 1.0) {
-      const float previous = static_cast<float>(
-          back >= 0 ? std::exp(row(back)[i]) : start_factor_);
-      product = static_cast<float>(previous * (1.0 - input_weight_) +
-                                   input_weight_ * product);
+                              : static_cast<float>(start * x);
+    if (weight < 1.0) {
+      const float previous =
+          static_cast<float>(back >= 0 ? std::exp(row(back)[i]) : start);
+      product =
+          static_cast<float>(previous * (1.0 - weight) + weight * product);
     }
     out[i] = std::log(product + kLogFloor);
   }

@@ -3,31 +3,21 @@
 // single-threaded results, and the counter must return to where it started.
 #include <gtest/gtest.h>
 
-#include <cstring>
 #include <memory>
 #include <thread>
 #include <vector>
 
 #include "jni/apm/audio_analyzer.h"
 #include "resampler/audio_resampler.h"
+#include "tests/test_signals.h"
 
 namespace {
 
-std::vector<uint8_t> Clicks(int rate, double period, int seconds) {
-  std::vector<uint8_t> pcm(static_cast<size_t>(rate) * seconds * 2);
-  for (size_t i = 0; i < pcm.size() / 2; ++i) {
-    const size_t since = i % static_cast<size_t>(rate * period);
-    const int16_t v = since < 200 ? static_cast<int16_t>((since % 20) * 1500 - 15000)
-                                  : static_cast<int16_t>((i * 7919) % 64 - 32);
-    std::memcpy(&pcm[2 * i], &v, 2);
-  }
-  return pcm;
-}
-
-std::vector<float> Beats(const std::vector<uint8_t>& pcm, int rate) {
+std::vector<float> Beats(const std::vector<int16_t>& pcm, int rate) {
   apm::AudioAnalyzer analyzer(rate);
   const int32_t n = analyzer.CalculateBeats(
-      pcm.data(), static_cast<int32_t>(pcm.size()), 1, [](char) { return false; });
+      reinterpret_cast<const uint8_t*>(pcm.data()), static_cast<int32_t>(2 * pcm.size()), 1,
+      [](char) { return false; });
   return n > 0 ? std::vector<float>(analyzer.beats(), analyzer.beats() + n)
                : std::vector<float>();
 }
@@ -50,11 +40,11 @@ std::vector<int16_t> Resampled(int32_t from, int32_t to, int blocks) {
 TEST(Threads, AnalysesAndResamplersMatchTheirSingleThreadedResults) {
   const uint32_t load_before = norvane::AudioResampler::getCurrentLoadMHz();
   const int kThreads = 6;
-  std::vector<std::vector<uint8_t>> tracks;
+  std::vector<std::vector<int16_t>> tracks;
   std::vector<std::vector<float>> beats;
   std::vector<std::vector<int16_t>> resampled;
   for (int i = 0; i < kThreads; ++i) {
-    tracks.push_back(Clicks(8000, 0.4 + 0.05 * i, 6));
+    tracks.push_back(test_signals::Clicks(8000, 1, 6, 0.4 + 0.05 * i));
     beats.push_back(Beats(tracks[i], 8000));
     resampled.push_back(Resampled(44100, 48000 - 4000 * i, 20));
   }

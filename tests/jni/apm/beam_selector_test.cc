@@ -9,18 +9,37 @@
 namespace apm {
 namespace {
 
-TEST(BeamSelector, HeapOrderForEqualValuesAndFullHeaps) {
-  BeamSelector selector;
-  const double equal[] = {0, 0, 0, 0, 0};
-  std::vector<int32_t> beam(5);
-  selector.Select(equal, 4, 4, beam.data());
-  EXPECT_EQ(beam, (std::vector<int32_t>{0, 1, 3, 2, 0}));
-  selector.Select(equal, 5, 5, beam.data());
-  EXPECT_EQ(beam, (std::vector<int32_t>{0, 1, 3, 4, 2}));
-  // Full: a value must exceed the root to get in; the two 5s tie.
-  const double values[] = {3, 1, 4, 1, 5, 9, 2, 6, 5, 3};
-  selector.Select(values, 10, 3, beam.data());
-  EXPECT_EQ(beam, (std::vector<int32_t>{4, 7, 5, 4, 2}));
+// The beam is the order in which a min-heap fed in index order pops its
+// entries, so equal values come out in the heap's own order. Expected beams
+// from a separate model of the heap's push, pop and skip rules.
+TEST(BeamSelector, LiteralHeapOrderOnTies) {
+  const struct {
+    std::vector<double> values;
+    int32_t width;
+    std::vector<int32_t> beam;
+  } cases[] = {
+      {{0, 0, 0, 0}, 4, {0, 1, 3, 2}},
+      {{0, 0, 0, 0, 0}, 5, {0, 1, 3, 4, 2}},
+      {{0, 0, 0, 0, 0, 0, 0}, 7, {0, 1, 3, 6, 5, 4, 2}},
+      {{1, 0, 1, 0, 1, 0}, 6, {1, 3, 5, 0, 2, 4}},
+      {{2, 1, 1, 1, 1, 2, 2}, 4, {2, 0, 6, 5}},
+      {{1, 1, 1, 1, 1, 1, 1, 1}, 3, {0, 1, 2}},  // equal to the root: skipped
+      {{3, 1, 4, 1, 5, 9, 2, 6, 5, 3}, 3, {4, 7, 5}},
+      {{5, 5, 1, 5, 5, 1, 5}, 5, {1, 3, 4, 6, 0}},
+      {{0, 1, 0, 1, 0, 1, 0, 1}, 4, {1, 5, 7, 3}},
+      {{2, 2, 2, 1, 1, 1, 3, 3}, 6, {5, 1, 2, 0, 7, 6}},
+  };
+  for (const auto& c : cases) {
+    const int32_t count = static_cast<int32_t>(c.values.size());
+    std::vector<int32_t> heap(c.width), select(c.width), reselect(c.width);
+    BeamSelector a, b, d;
+    a.SelectByHeap(c.values.data(), count, c.width, heap.data());
+    b.Select(c.values.data(), count, c.width, select.data());
+    d.Reselect(c.values.data(), count, nullptr, 0, c.width, reselect.data());
+    EXPECT_EQ(heap, c.beam) << testing::PrintToString(c.values);
+    EXPECT_EQ(select, c.beam) << testing::PrintToString(c.values);
+    EXPECT_EQ(reselect, c.beam) << testing::PrintToString(c.values);
+  }
 }
 
 // Rows drifting from frame to frame like the tracker's, now and then with

@@ -62,35 +62,5 @@ TEST(SpectrogramCalculator, FailuresAreReportedByTheStage) {
   EXPECT_EQ(no_step.num_frames(), 0);
 }
 
-TEST(SpectrogramCalculator, StreamingMatchesOneCall) {
-  std::vector<float> signal(20000);
-  for (size_t i = 0; i < signal.size(); ++i) signal[i] = static_cast<float>((i * 7919) % 2000) - 1000;
-  SpectrogramCalculator whole(0.04f, 0.03f), stream(0.04f, 0.03f);
-  std::vector<float> whole_reports, stream_reports;
-  std::vector<SpectrogramFrame> expected;
-  ASSERT_TRUE(whole.Initialize(11025));
-  ASSERT_TRUE(whole.ComputeSpectrogram(
-      signal, &expected, [&](float p) { whole_reports.push_back(p); return false; }));
-
-  ASSERT_TRUE(stream.Initialize(11025));
-  stream.BeginStream(static_cast<int32_t>(signal.size()));
-  std::vector<SpectrogramFrame> frames;
-  const ProgressCallback record = [&](float p) { stream_reports.push_back(p); return false; };
-  for (size_t start = 0; start < signal.size(); start += 777) {
-    const int32_t count = static_cast<int32_t>(std::min<size_t>(777, signal.size() - start));
-    ASSERT_TRUE(stream.StreamBlock(signal.data() + start, count, record, [&](const double* bins) {
-      SpectrogramFrame& frame = frames.emplace_back(stream.bin_count());
-      for (int k = 0; k < stream.bin_count(); ++k) {
-        frame[k] = {static_cast<float>(bins[2 * k]), static_cast<float>(bins[2 * k + 1])};
-      }
-    }));
-  }
-  stream.EndStream();
-  EXPECT_EQ(frames, expected);
-  EXPECT_EQ(stream_reports, whole_reports);
-  EXPECT_EQ(stream.num_frames(), whole.num_frames());
-  EXPECT_EQ(stream.num_input_samples(), whole.num_input_samples());
-}
-
 }  // namespace
 }  // namespace apm
