@@ -13,11 +13,13 @@
 #define CLIPWEAVER_FFT_COMPLEX_FFT_H_
 
 #include <cstddef>
+#include <type_traits>
 
 #include "fft/complex_ops.h"
 #include "fft/twiddles.h"
 
 namespace fft_internal {
+inline namespace CLIPWEAVER_ISA {
 
 // Element at p of a layout whose imaginary parts lie `im` doubles behind
 // the real ones.
@@ -217,11 +219,17 @@ inline void SecondStage4(double* p, std::ptrdiff_t im) {
   Put(p + 6, im, MinusI(p1, q1));
 }
 
+// The radix-4 pass on two columns at a time (paired_radix4.h), for a W that
+// holds two V.
+template <typename V, typename W>
+void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t);
+
 // The complex stage up to its last stage, forward (exp(+...)) or on the
 // conjugated input: a decimation in time of the h = n/4 elements from
 // bit-reversed order to natural order, taking one or two first stages so
-// that radix 4 does the rest; w_end points behind the twiddle region.
-template <typename V, bool kConj>
+// that radix 4 does the rest; w_end points behind the twiddle region. The
+// radix-4 passes run over W, two elements at a time, where W is wider than V.
+template <typename V, typename W, bool kConj>
 void LaneTransform(int n, double* a, const double* w_end) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
@@ -236,9 +244,16 @@ void LaneTransform(int n, double* a, const double* w_end) {
       length = 8;
     }
   }
-  for (; length <= h; length *= 4) Radix4Pass<V>(length, a, im, h, w_end - length / 2);
+  for (; length <= h; length *= 4) {
+    if constexpr (std::is_same_v<V, W>) {
+      Radix4Pass<V>(length, a, im, h, w_end - length / 2);
+    } else {
+      PairedRadix4Pass<V, W>(length, a, im, h, w_end - length / 2);
+    }
+  }
 }
 
+}  // namespace CLIPWEAVER_ISA
 }  // namespace fft_internal
 
 #endif  // CLIPWEAVER_FFT_COMPLEX_FFT_H_

@@ -1,6 +1,6 @@
 // The real FFT of real_fft.h over tables that are already built, for a
-// given two-lane type V. RealFft runs it with the target's Double2; running
-// it with PlainDouble2 as well shows both give the same bits.
+// given two-lane type V and, for the radix-4 passes, a type W of one or two
+// V (Double4 where AVX runs). Every choice gives the same bits.
 #ifndef CLIPWEAVER_FFT_REAL_TRANSFORM_H_
 #define CLIPWEAVER_FFT_REAL_TRANSFORM_H_
 
@@ -9,6 +9,7 @@
 #include "fft/twiddles.h"
 
 namespace fft_internal {
+inline namespace CLIPWEAVER_ISA {
 
 // The split step on bins paired lane by lane: low holds X[k] of the n/2
 // complex points, high X[n/2 - k]; the weight is (wr, wi), conjugated
@@ -120,9 +121,9 @@ void SplitBackward(int n, double* a, const double* c, int nc) {
 
 // The whole complex stage for n >= 8, unscaled, exp(+...) forward and
 // exp(-...) backward.
-template <typename V, bool kForward>
+template <typename V, typename W, bool kForward>
 void ComplexStage(int n, double* data, const double* w_end, int nc) {
-  LaneTransform<V, !kForward>(n, data, w_end);
+  LaneTransform<V, W, !kForward>(n, data, w_end);
   Combine<V, kForward>(n, data, w_end - (n >> 2), w_end, nc);
 }
 
@@ -135,14 +136,14 @@ inline void TwoPoints(double* data) {
   data[3] = im;
 }
 
-template <typename V>
+template <typename V, typename W = V>
 void RealTransform(int n, int direction, double* data, const int* bit_reversal_work,
                    const double* twiddle_table) {
   const double* w_end = twiddle_table + bit_reversal_work[0];
   const int nc = bit_reversal_work[1];
   if (direction >= 0) {
     if (n >= 8) {
-      ComplexStage<V, true>(n, data, w_end, nc);
+      ComplexStage<V, W, true>(n, data, w_end, nc);
     } else if (n == 4) {
       TwoPoints(data);
     }
@@ -154,13 +155,14 @@ void RealTransform(int n, int direction, double* data, const int* bit_reversal_w
     data[0] -= data[1];
     if (n >= 8) {
       SplitBackward<V>(n, data, w_end, nc);
-      ComplexStage<V, false>(n, data, w_end, nc);
+      ComplexStage<V, W, false>(n, data, w_end, nc);
     } else if (n == 4) {
       TwoPoints(data);
     }
   }
 }
 
+}  // namespace CLIPWEAVER_ISA
 }  // namespace fft_internal
 
 #endif  // CLIPWEAVER_FFT_REAL_TRANSFORM_H_

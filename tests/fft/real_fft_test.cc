@@ -10,6 +10,8 @@
 
 #include "fft/complex_ops.h"
 #include "fft/real_transform.h"
+#include "fft/real_transform_avx.h"
+#include "base/instruction_set.h"
 
 namespace {
 
@@ -178,6 +180,20 @@ TEST(RealFft, SimdKernelsGiveThePlainBits) {
     fft_internal::RealTransform<PlainDouble2>(n, -1, plain.data(), space.work.data(),
                                               space.table.data());
     ASSERT_TRUE(same_bits(simd, plain));
+#if defined(__x86_64__)
+    if (instruction_set::HasAvx()) {
+      std::vector<double> wide = Noise(n, 5 * n);
+      plain = wide;
+      fft_internal::RealTransformAvx(n, 1, wide.data(), space.work.data(), space.table.data());
+      fft_internal::RealTransform<PlainDouble2>(n, 1, plain.data(), space.work.data(),
+                                                space.table.data());
+      ASSERT_TRUE(same_bits(wide, plain));
+      fft_internal::RealTransformAvx(n, -1, wide.data(), space.work.data(), space.table.data());
+      fft_internal::RealTransform<PlainDouble2>(n, -1, plain.data(), space.work.data(),
+                                                space.table.data());
+      ASSERT_TRUE(same_bits(wide, plain));
+    }
+#endif
   }
 }
 
