@@ -4,6 +4,9 @@
 #ifndef CLIPWEAVER_FFT_REAL_TRANSFORM_H_
 #define CLIPWEAVER_FFT_REAL_TRANSFORM_H_
 
+#include <cstddef>
+#include <type_traits>
+
 #include "fft/complex_fft.h"
 #include "fft/complex_ops.h"
 #include "fft/twiddles.h"
@@ -33,10 +36,14 @@ inline void SplitBins(Complex2<V>* low, Complex2<V>* high, V wr, V wi) {
 // X[2h - k], which take those of the imaginary parts: w^(h - k) = -conj(w^k)
 // is why the second lane of wr is negated. Forward, the split step follows
 // on the pairs (k, 2h - k) and (h - k, h + k) with the weights of bins k and
-// h - k at ck and cm; backward, the output is conjugated.
+// h - k as c_km = (ck, cm) and c_mk = (cm, ck); backward, the output is
+// conjugated. Returns what goes to x, y, x + im and y + im.
+template <typename V>
+struct CombinedGroup {
+  V at_x, at_y, at_x_im, at_y_im;
+};
 template <typename V, bool kForward>
-inline void CombineGroup(Complex2<V> xk, Complex2<V> xm, double* x, double* y, std::ptrdiff_t im,
-                         V wr, V wi, const double* ck, const double* cm) {
+inline CombinedGroup<V> CombineGroup(Complex2<V> xk, Complex2<V> xm, V wr, V wi, V c_km, V c_mk) {
   const Complex2<V> even = {UnpackLow(xk.re, xm.re), UnpackLow(xk.im, xm.im)};
   const Complex2<V> odd = {UnpackHigh(xk.re, xm.re), UnpackHigh(xk.im, xm.im)};
   const Complex2<V> t = Mul(odd, wr, wi);
@@ -44,19 +51,32 @@ inline void CombineGroup(Complex2<V> xk, Complex2<V> xm, double* x, double* y, s
   Complex2<V> high = even - t;
   if (kForward) {
     high = {Swap(high.re), Swap(high.im)};
-    SplitBins<V, false>(&low, &high, Splat<V>(0.5) - Make<V>(*cm, *ck), Make<V>(*ck, *cm));
-    Store(x, UnpackLow(low.re, low.im));
-    Store(y, UnpackHigh(low.re, low.im));
-    Store(y + im, UnpackLow(high.re, high.im));
-    Store(x + im, UnpackHigh(high.re, high.im));
-  } else {
-    low.im = Neg(low.im);
-    high.im = Neg(high.im);
-    Store(x, UnpackLow(low.re, low.im));
-    Store(y, UnpackHigh(low.re, low.im));
-    Store(x + im, UnpackLow(high.re, high.im));
-    Store(y + im, UnpackHigh(high.re, high.im));
+    SplitBins<V, false>(&low, &high, Splat<V>(0.5) - c_mk, c_km);
+    return {UnpackLow(low.re, low.im), UnpackHigh(low.re, low.im), UnpackHigh(high.re, high.im),
+            UnpackLow(high.re, high.im)};
   }
+  low.im = Neg(low.im);
+  high.im = Neg(high.im);
+  return {UnpackLow(low.re, low.im), UnpackHigh(low.re, low.im), UnpackLow(high.re, high.im),
+          UnpackHigh(high.re, high.im)};
+}
+
+// Groups k and k + 1 side by side in W, for the places x and y of group k;
+// the places of group k + 1 lie above (+) or below (-) them.
+template <typename V, typename W, bool kForward, int kXDirection, int kYDirection>
+inline void CombinePair(double* x, double* y, std::ptrdiff_t im, V wr0, V wi0, V c_km0, V c_mk0,
+                        V wr1, V wi1, V c_km1, V c_mk1) {
+  double* const px = kXDirection > 0 ? x : x - 2;
+  double* const py = kYDirection > 0 ? y : y - 2;
+  const auto in_order = [](W v, int direction) { return direction > 0 ? v : SwapHalves(v); };
+  const Complex2<W> xk = {in_order(Load<W>(px), kXDirection), in_order(Load<W>(px + im), kXDirection)};
+  const Complex2<W> xm = {in_order(Load<W>(py), kYDirection), in_order(Load<W>(py + im), kYDirection)};
+  const CombinedGroup<W> out = CombineGroup<W, kForward>(
+      xk, xm, Join(wr0, wr1), Join(wi0, wi1), Join(c_km0, c_km1), Join(c_mk0, c_mk1));
+  Store(px, in_order(out.at_x, kXDirection));
+  Store(py, in_order(out.at_y, kYDirection));
+  Store(px + im, in_order(out.at_x_im, kXDirection));
+  Store(py + im, in_order(out.at_y_im, kYDirection));
 }
 
 // Last complex stage over the whole lane layout, back to (re, im) pairs in
@@ -65,7 +85,7 @@ inline void CombineGroup(Complex2<V> xk, Complex2<V> xm, double* x, double* y, s
 // sub-table for the complex length 2h; the split weights are (1 - sin)/2
 // and cos/2 of pi k / (2h), from the cosine region c of nc entries, and
 // those of bins k and h - k share their entries.
-template <typename V, bool kForward>
+template <typename V, typename W, bool kForward>
 void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
@@ -73,7 +93,12 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   const double* const c_end = c + nc;
   const double* const c_half = c + nc / 2;
   auto group = [&](double* x, double* y, V wr, V wi, const double* ck, const double* cm) {
-    CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), x, y, im, wr, wi, ck, cm);
+    const CombinedGroup<V> out = CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi,
+                                                           Make<V>(*ck, *cm), Make<V>(*cm, *ck));
+    Store(x, out.at_x);
+    Store(y, out.at_y);
+    Store(x + im, out.at_x_im);
+    Store(y + im, out.at_y_im);
   };
   // Element 0 gives X[0] = E[0] + O[0] and X[h] = E[0] - O[0].
   const V sign = Make<V>(1, kForward ? 1 : -1);
@@ -81,14 +106,46 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   const V even = UnpackLow(re, im0), odd = UnpackHigh(re, im0);
   Store(a, (even + odd) * sign);
   Store(a + im, (even - odd) * sign);
-  // Group h/2 - k takes w^(h/2 - k) = i conj(w^k).
+  // Group h/2 - k takes w^(h/2 - k) = i conj(w^k). With W wider than V,
+  // groups k and k + 1 run together for odd k.
+  struct Twiddles {
+    std::ptrdiff_t k;
+    V w;
+  };
+  Twiddles pending{0, Splat<V>(0)};
   ForEachTwiddle<V>(2 * h, tw, [&](std::ptrdiff_t k, V w, V) {
+    if constexpr (!std::is_same_v<V, W>) {
+      if (k % 2) {
+        pending = {k, w};
+        return;
+      }
+      const std::ptrdiff_t k0 = pending.k, kk0 = k0 * step, kk = k * step;
+      const V w0 = pending.w, negated0 = Neg(w0), negated = Neg(w);
+      pending.k = 0;
+      CombinePair<V, W, kForward, 1, -1>(
+          a + 2 * k0, a + im - 2 * k0, im, UnpackLow(w0, negated0), DupHigh(w0),
+          Make<V>(c[kk0], c_end[-kk0]), Make<V>(c_end[-kk0], c[kk0]), UnpackLow(w, negated),
+          DupHigh(w), Make<V>(c[kk], c_end[-kk]), Make<V>(c_end[-kk], c[kk]));
+      CombinePair<V, W, kForward, -1, 1>(
+          a + h - 2 * k0, a + h + 2 * k0, im, UnpackHigh(w0, negated0), DupLow(w0),
+          Make<V>(c_half[-kk0], c_half[kk0]), Make<V>(c_half[kk0], c_half[-kk0]),
+          UnpackHigh(w, negated), DupLow(w), Make<V>(c_half[-kk], c_half[kk]),
+          Make<V>(c_half[kk], c_half[-kk]));
+      return;
+    }
     const V negated = Neg(w);
     const std::ptrdiff_t kk = k * step;
     group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
     group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
           c_half + kk);
   });
+  if (pending.k) {
+    const std::ptrdiff_t k = pending.k, kk = k * step;
+    const V w = pending.w, negated = Neg(w);
+    group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
+    group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
+          c_half + kk);
+  }
   if (h >= 4) {
     const V c4 = Splat<V>(kC4);
     group(a + h / 2, a + im - h / 2, c4 * Make<V>(1, -1), c4, c + nc / 4, c_end - nc / 4);
@@ -124,7 +181,7 @@ void SplitBackward(int n, double* a, const double* c, int nc) {
 template <typename V, typename W, bool kForward>
 void ComplexStage(int n, double* data, const double* w_end, int nc) {
   LaneTransform<V, W, !kForward>(n, data, w_end);
-  Combine<V, kForward>(n, data, w_end - (n >> 2), w_end, nc);
+  Combine<V, W, kForward>(n, data, w_end - (n >> 2), w_end, nc);
 }
 
 // The complex stage for n = 4, the same both ways.
