@@ -57,13 +57,17 @@ std::vector<double> Noise(int n, unsigned seed) {
 // reduced angles.
 std::vector<double> DirectDft(const std::vector<double>& x) {
   const int n = static_cast<int>(x.size());
-  std::vector<double> packed(n);
+  std::vector<double> cosine(n), sine(n), packed(n);
+  for (int r = 0; r < n; ++r) {
+    cosine[r] = std::cos(kTwoPi * r / n);
+    sine[r] = std::sin(kTwoPi * r / n);
+  }
   for (int k = 0; k <= n / 2; ++k) {
     double re = 0, im = 0;
     for (int j = 0; j < n; ++j) {
-      const double angle = kTwoPi * static_cast<double>(static_cast<long long>(j) * k % n) / n;
-      re += x[j] * std::cos(angle);
-      im += x[j] * std::sin(angle);
+      const int r = static_cast<int>(static_cast<long long>(j) * k % n);
+      re += x[j] * cosine[r];
+      im += x[j] * sine[r];
     }
     if (k == 0 || k == n / 2) {
       packed[k == 0 ? 0 : 1] = re;
