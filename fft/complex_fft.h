@@ -99,14 +99,42 @@ inline void ReadPair(const double* a, int h, int e, Complex2<V>* sum, Complex2<V
 // blocks starting from elements 2^(kStages-1) g + r form group g, which
 // reads exactly the places that group reverse(g) writes, so groups are
 // worked out in pairs; two stages need a buffer for one group of the pair.
-// kConj conjugates the input. Needs h >= 2^(2 kStages - 1).
-template <typename V, bool kConj, int kStages>
+// kConj conjugates the input. Needs h >= 2^(2 kStages - 1). A wider W
+// takes the single forward stage.
+template <typename V, typename W, bool kConj, int kStages>
 void FirstStages(int n, double* a) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int bits = 0;
   for (int m = h; m > 1; m >>= 1) ++bits;
-  if constexpr (kStages == 1) {
+  if constexpr (kStages == 1 && !kConj && !std::is_same_v<V, W>) {
+    // The same sums and differences with the four points of group e in one
+    // W, sorted into real and imaginary parts afterwards.
+    const auto read = [&](int e, W* re, W* im_parts) {
+      const W x = Load<W>(a + 4 * e), y = Load<W>(a + 4 * e + 2 * h);
+      const W sum = x + y, difference = x - y;
+      const W low = LowHalves(sum, difference), high = HighHalves(sum, difference);
+      *re = UnpackLow(low, high);
+      *im_parts = UnpackHigh(low, high);
+    };
+    ForEachReversal(
+        bits - 1,
+        [&](int g, int partner) {
+          W re, im_parts, partner_re, partner_im;
+          read(g, &re, &im_parts);
+          read(partner, &partner_re, &partner_im);
+          Store(a + 4 * partner, re);
+          Store(a + 4 * partner + im, im_parts);
+          Store(a + 4 * g, partner_re);
+          Store(a + 4 * g + im, partner_im);
+        },
+        [&](int g) {
+          W re, im_parts;
+          read(g, &re, &im_parts);
+          Store(a + 4 * g, re);
+          Store(a + 4 * g + im, im_parts);
+        });
+  } else if constexpr (kStages == 1) {
     // Group g is block reverse(g) = partner, at 4 partner.
     ForEachReversal(
         bits - 1,
@@ -235,9 +263,9 @@ void LaneTransform(int n, double* a, const double* w_end) {
   const std::ptrdiff_t im = 2 * h;
   int length = 16;
   if (n >= 64 && (n & 0x55555555)) {
-    FirstStages<V, kConj, 2>(n, a);
+    FirstStages<V, V, kConj, 2>(n, a);
   } else {
-    FirstStages<V, kConj, 1>(n, a);
+    FirstStages<V, W, kConj, 1>(n, a);
     if (n == 16) {
       SecondStage4<V>(a, im);
     } else {

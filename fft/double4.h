@@ -44,6 +44,9 @@ inline Double4 UnpackHigh(Double4 a, Double4 b) { return {_mm256_unpackhi_pd(a.v
 inline Double4 Join(Double2 low, Double2 high) {
   return {_mm256_insertf128_pd(_mm256_castpd128_pd256(low.v), high.v, 1)};
 }
+// The low halves of a and b, and their high halves.
+inline Double4 LowHalves(Double4 a, Double4 b) { return {_mm256_permute2f128_pd(a.v, b.v, 0x20)}; }
+inline Double4 HighHalves(Double4 a, Double4 b) { return {_mm256_permute2f128_pd(a.v, b.v, 0x31)}; }
 // The halves exchanged.
 inline Double4 SwapHalves(Double4 a) { return {_mm256_permute2f128_pd(a.v, a.v, 1)}; }
 // The low half of a and the high half of b.
