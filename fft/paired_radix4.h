@@ -33,12 +33,6 @@ SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
   return {low, high};
 }
 
-// The cosines and sines of w^k, w^2k and conj(w^3k) of one column.
-template <typename V>
-struct ColumnTwiddles {
-  V c1, s1, c2, s2, c3, s3;
-};
-
 template <typename V, typename W>
 void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t) {
   const std::ptrdiff_t s = length / 2, step = 2 * length;
@@ -51,41 +45,40 @@ void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const dou
            Split(Unturned(), TurnThreeEighths()));
     return;
   }
-  // Turns of column k (low half) beside column k' (high half), and of their
-  // mirrors: w^(q - k) = i conj(w^k), w^2(q - k) = -conj(w^2k),
-  // w^3(q - k) = -i conj(w^3k).
-  const auto turns = [](const ColumnTwiddles<V>& k, const ColumnTwiddles<V>& k2) {
-    return [=](auto f) {
-      f(Turn<W>{Join(k.c2, k2.c2), Join(k.s2, k2.s2)}, Turn<W>{Join(k.c1, k2.c1), Join(k.s1, k2.s1)},
-        TurnConj<W>{Join(k.c3, k2.c3), Join(k.s3, k2.s3)});
-    };
+  // Turns of two columns from their w^k and conj(w^3k), one column per
+  // half, or of their mirrors: w^(q - k) = i conj(w^k),
+  // w^2(q - k) = -conj(w^2k), w^3(q - k) = -i conj(w^3k).
+  const auto turns = [](W w1, W w3, bool mirror, auto f) {
+    const W w2 = Square(w1);
+    const W c1 = DupLow(w1), s1 = DupHigh(w1), c2 = DupLow(w2), s2 = DupHigh(w2);
+    const W c3 = DupLow(w3), s3 = DupHigh(w3);
+    if (mirror) {
+      f(Turn<W>{Neg(c2), s2}, Turn<W>{s1, c1}, TurnConj<W>{s3, c3});
+    } else {
+      f(Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
+    }
   };
-  const auto mirror_turns = [](const ColumnTwiddles<V>& k, const ColumnTwiddles<V>& k2) {
-    return [=](auto f) {
-      f(Turn<W>{Join(Neg(k.c2), Neg(k2.c2)), Join(k.s2, k2.s2)},
-        Turn<W>{Join(k.s1, k2.s1), Join(k.c1, k2.c1)},
-        TurnConj<W>{Join(k.s3, k2.s3), Join(k.c3, k2.c3)});
-    };
-  };
-  ColumnTwiddles<V> previous{};
+  V previous1 = Splat<V>(0), previous3 = previous1;
   ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
-    const V w2 = Square(w1);
-    const ColumnTwiddles<V> now = {DupLow(w1), DupHigh(w1), DupLow(w2),
-                                   DupHigh(w2), DupLow(w3), DupHigh(w3)};
     if (k == 1) {
-      turns(now, now)([&](auto t2, auto t1, auto t3) {
+      turns(Join(w1, w1), Join(w3, w3), false, [&](auto t2, auto t1, auto t3) {
         column(a, Split(Unturned(), t2), Split(Unturned(), t1), Split(Unturned(), t3));
       });
     } else if (k % 2) {
-      turns(previous, now)([&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
+      turns(Join(previous1, w1), Join(previous3, w3), false,
+            [&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
     } else {
-      mirror_turns(now, previous)([&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
+      turns(Join(w1, previous1), Join(w3, previous3), true,
+            [&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
     }
-    previous = now;
+    previous1 = w1;
+    previous3 = w3;
   });
-  mirror_turns(previous, previous)([&](auto t2, auto t1, auto t3) {
-    column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1), Split(TurnThreeEighths(), t3));
-  });
+  turns(Join(previous1, previous1), Join(previous3, previous3), true,
+        [&](auto t2, auto t1, auto t3) {
+          column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1),
+                 Split(TurnThreeEighths(), t3));
+        });
 }
 
 }  // namespace CLIPWEAVER_ISA

@@ -62,17 +62,16 @@ inline CombinedGroup<V> CombineGroup(Complex2<V> xk, Complex2<V> xm, V wr, V wi,
 }
 
 // Groups k and k + 1 side by side in W, for the places x and y of group k;
-// the places of group k + 1 lie above (+) or below (-) them.
-template <typename V, typename W, bool kForward, int kXDirection, int kYDirection>
-inline void CombinePair(double* x, double* y, std::ptrdiff_t im, V wr0, V wi0, V c_km0, V c_mk0,
-                        V wr1, V wi1, V c_km1, V c_mk1) {
+// the places of group k + 1 lie above (+) or below (-) them. The twiddles
+// and the weights c_km come as W already, one group per half.
+template <typename W, bool kForward, int kXDirection, int kYDirection>
+inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c_km) {
   double* const px = kXDirection > 0 ? x : x - 2;
   double* const py = kYDirection > 0 ? y : y - 2;
   const auto in_order = [](W v, int direction) { return direction > 0 ? v : SwapHalves(v); };
   const Complex2<W> xk = {in_order(Load<W>(px), kXDirection), in_order(Load<W>(px + im), kXDirection)};
   const Complex2<W> xm = {in_order(Load<W>(py), kYDirection), in_order(Load<W>(py + im), kYDirection)};
-  const CombinedGroup<W> out = CombineGroup<W, kForward>(
-      xk, xm, Join(wr0, wr1), Join(wi0, wi1), Join(c_km0, c_km1), Join(c_mk0, c_mk1));
+  const CombinedGroup<W> out = CombineGroup<W, kForward>(xk, xm, wr, wi, c_km, Swap(c_km));
   Store(px, in_order(out.at_x, kXDirection));
   Store(py, in_order(out.at_y, kYDirection));
   Store(px + im, in_order(out.at_x_im, kXDirection));
@@ -120,17 +119,14 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
         return;
       }
       const std::ptrdiff_t k0 = pending.k, kk0 = k0 * step, kk = k * step;
-      const V w0 = pending.w, negated0 = Neg(w0), negated = Neg(w);
       pending.k = 0;
-      CombinePair<V, W, kForward, 1, -1>(
-          a + 2 * k0, a + im - 2 * k0, im, UnpackLow(w0, negated0), DupHigh(w0),
-          Make<V>(c[kk0], c_end[-kk0]), Make<V>(c_end[-kk0], c[kk0]), UnpackLow(w, negated),
-          DupHigh(w), Make<V>(c[kk], c_end[-kk]), Make<V>(c_end[-kk], c[kk]));
-      CombinePair<V, W, kForward, -1, 1>(
-          a + h - 2 * k0, a + h + 2 * k0, im, UnpackHigh(w0, negated0), DupLow(w0),
-          Make<V>(c_half[-kk0], c_half[kk0]), Make<V>(c_half[kk0], c_half[-kk0]),
-          UnpackHigh(w, negated), DupLow(w), Make<V>(c_half[-kk], c_half[kk]),
-          Make<V>(c_half[kk], c_half[-kk]));
+      const W both = Join(pending.w, w), negated = Neg(both);
+      CombinePair<W, kForward, 1, -1>(
+          a + 2 * k0, a + im - 2 * k0, im, UnpackLow(both, negated), DupHigh(both),
+          Join(Make<V>(c[kk0], c_end[-kk0]), Make<V>(c[kk], c_end[-kk])));
+      CombinePair<W, kForward, -1, 1>(
+          a + h - 2 * k0, a + h + 2 * k0, im, UnpackHigh(both, negated), DupLow(both),
+          Join(Make<V>(c_half[-kk0], c_half[kk0]), Make<V>(c_half[-kk], c_half[kk])));
       return;
     }
     const V negated = Neg(w);
