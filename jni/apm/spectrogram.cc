@@ -94,10 +94,12 @@ bool Spectrogram::ComputeComplexSpectrogram(
       if (progress(fraction)) return false;
     }
     TransformWindow();
-    SpectrogramFrame& bins = output->emplace_back(bin_count_);
+    // Filled as it grows: zeroing it first would be work thrown away.
+    SpectrogramFrame& bins = output->emplace_back();
+    bins.reserve(bin_count_);
     for (int32_t k = 0; k < bin_count_; ++k) {
-      bins[k] = {static_cast<float>(fft_buffer_[2 * k]),
-                 static_cast<float>(fft_buffer_[2 * k + 1])};
+      bins.emplace_back(static_cast<float>(fft_buffer_[2 * k]),
+                        static_cast<float>(fft_buffer_[2 * k + 1]));
     }
     ++frame;
   }
