@@ -9,6 +9,8 @@
 #ifndef CLIPWEAVER_BASE_FLOAT4_H_
 #define CLIPWEAVER_BASE_FLOAT4_H_
 
+#include "base/instruction_set.h"
+
 #include <cmath>
 
 #if defined(__SSE2__)
@@ -18,6 +20,7 @@
 #endif
 
 namespace simd {
+inline namespace CLIPWEAVER_ISA {
 
 template <typename V>
 V Load(const float* p);
@@ -144,6 +147,7 @@ inline void LoadComplex(const float* p, Float4* re, Float4* im) {
 
 #endif
 
+}  // namespace CLIPWEAVER_ISA
 }  // namespace simd
 
 #endif  // CLIPWEAVER_BASE_FLOAT4_H_

@@ -13,11 +13,13 @@
 #define CLIPWEAVER_FFT_COMPLEX_FFT_H_
 
 #include <cstddef>
+#include <type_traits>
 
 #include "fft/complex_ops.h"
 #include "fft/twiddles.h"
 
 namespace fft_internal {
+inline namespace CLIPWEAVER_ISA {
 
 // Element at p of a layout whose imaginary parts lie `im` doubles behind
 // the real ones.
@@ -97,14 +99,42 @@ inline void ReadPair(const double* a, int h, int e, Complex2<V>* sum, Complex2<V
 // blocks starting from elements 2^(kStages-1) g + r form group g, which
 // reads exactly the places that group reverse(g) writes, so groups are
 // worked out in pairs; two stages need a buffer for one group of the pair.
-// kConj conjugates the input. Needs h >= 2^(2 kStages - 1).
-template <typename V, bool kConj, int kStages>
+// kConj conjugates the input. Needs h >= 2^(2 kStages - 1). A wider W
+// takes the single forward stage.
+template <typename V, typename W, bool kConj, int kStages>
 void FirstStages(int n, double* a) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int bits = 0;
   for (int m = h; m > 1; m >>= 1) ++bits;
-  if constexpr (kStages == 1) {
+  if constexpr (kStages == 1 && !kConj && !std::is_same_v<V, W>) {
+    // The same sums and differences with the four points of group e in one
+    // W, sorted into real and imaginary parts afterwards.
+    const auto read = [&](int e, W* re, W* im_parts) {
+      const W x = Load<W>(a + 4 * e), y = Load<W>(a + 4 * e + 2 * h);
+      const W sum = x + y, difference = x - y;
+      const W low = LowHalves(sum, difference), high = HighHalves(sum, difference);
+      *re = UnpackLow(low, high);
+      *im_parts = UnpackHigh(low, high);
+    };
+    ForEachReversal(
+        bits - 1,
+        [&](int g, int partner) {
+          W re, im_parts, partner_re, partner_im;
+          read(g, &re, &im_parts);
+          read(partner, &partner_re, &partner_im);
+          Store(a + 4 * partner, re);
+          Store(a + 4 * partner + im, im_parts);
+          Store(a + 4 * g, partner_re);
+          Store(a + 4 * g + im, partner_im);
+        },
+        [&](int g) {
+          W re, im_parts;
+          read(g, &re, &im_parts);
+          Store(a + 4 * g, re);
+          Store(a + 4 * g + im, im_parts);
+        });
+  } else if constexpr (kStages == 1) {
     // Group g is block reverse(g) = partner, at 4 partner.
     ForEachReversal(
         bits - 1,
@@ -217,28 +247,41 @@ inline void SecondStage4(double* p, std::ptrdiff_t im) {
   Put(p + 6, im, MinusI(p1, q1));
 }
 
+// The radix-4 pass on two columns at a time (paired_radix4.h), for a W that
+// holds two V.
+template <typename V, typename W>
+void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t);
+
 // The complex stage up to its last stage, forward (exp(+...)) or on the
 // conjugated input: a decimation in time of the h = n/4 elements from
 // bit-reversed order to natural order, taking one or two first stages so
-// that radix 4 does the rest; w_end points behind the twiddle region.
-template <typename V, bool kConj>
+// that radix 4 does the rest; w_end points behind the twiddle region. The
+// radix-4 passes run over W, two elements at a time, where W is wider than V.
+template <typename V, typename W, bool kConj>
 void LaneTransform(int n, double* a, const double* w_end) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int length = 16;
   if (n >= 64 && (n & 0x55555555)) {
-    FirstStages<V, kConj, 2>(n, a);
+    FirstStages<V, V, kConj, 2>(n, a);
   } else {
-    FirstStages<V, kConj, 1>(n, a);
+    FirstStages<V, W, kConj, 1>(n, a);
     if (n == 16) {
       SecondStage4<V>(a, im);
     } else {
       length = 8;
     }
   }
-  for (; length <= h; length *= 4) Radix4Pass<V>(length, a, im, h, w_end - length / 2);
+  for (; length <= h; length *= 4) {
+    if constexpr (std::is_same_v<V, W>) {
+      Radix4Pass<V>(length, a, im, h, w_end - length / 2);
+    } else {
+      PairedRadix4Pass<V, W>(length, a, im, h, w_end - length / 2);
+    }
+  }
 }
 
+}  // namespace CLIPWEAVER_ISA
 }  // namespace fft_internal
 
 #endif  // CLIPWEAVER_FFT_COMPLEX_FFT_H_

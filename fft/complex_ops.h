@@ -6,6 +6,8 @@
 #ifndef CLIPWEAVER_FFT_COMPLEX_OPS_H_
 #define CLIPWEAVER_FFT_COMPLEX_OPS_H_
 
+#include "base/instruction_set.h"
+
 #if defined(__SSE2__)
 #include <emmintrin.h>
 #elif defined(__ARM_NEON) && defined(__aarch64__)
@@ -13,6 +15,7 @@
 #endif
 
 namespace fft_internal {
+inline namespace CLIPWEAVER_ISA {
 
 template <typename V>
 V Load(const double* p);
@@ -144,6 +147,7 @@ inline Complex2<V> MulConj(Complex2<V> x, V wr, V wi) {
   return {x.re * wr + x.im * wi, x.im * wr - x.re * wi};
 }
 
+}  // namespace CLIPWEAVER_ISA
 }  // namespace fft_internal
 
 #endif  // CLIPWEAVER_FFT_COMPLEX_OPS_H_

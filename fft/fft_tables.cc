@@ -7,20 +7,6 @@ namespace {
 
 constexpr double kQuarterPi = 0.7853981633974483;
 
-void BuildBitReversal(int nw, int* work) {
-  work[2] = 0;
-  work[3] = 16;
-  int m = 2;
-  for (int l = nw; l > 32; l >>= 2) {
-    for (int i = m; i < 2 * m; ++i) {
-      const int p = work[i] << 2;
-      work[m + i] = p;
-      work[2 * m + i] = p + 16 * m;
-    }
-    m <<= 1;
-  }
-}
-
 void BuildTwiddleRegion(int nw, int* work, double* w) {
   work[0] = nw;
   work[1] = 1;
@@ -64,7 +50,6 @@ void BuildTwiddleRegion(int nw, int* work, double* w) {
     }
     parent = sub;
   }
-  if (nw > 8) BuildBitReversal(nw, work);
 }
 
 void BuildCosineRegion(int nc, double* c) {

@@ -1,11 +1,10 @@
-// Twiddle, cosine and bit-reversal tables of the real FFT, kept in the
+// Twiddle and cosine tables of the real FFT, kept in the
 // caller's work areas.
 //
 // bit_reversal_work[0] = nw, the size of the twiddle region at the start of
 // the twiddle table; bit_reversal_work[1] = nc, the size of the cosine region
-// right behind it; bit_reversal_work[m .. 2m-1] = 8m * bitrev_m(0 .. m-1) for
-// every level m = 2, 4, ... built. The offsets belong to the work-area
-// layout callers rely on; the transform itself reverses indices on its own.
+// right behind it. The rest of that area is left alone: the transform
+// reverses indices on its own.
 //
 // The twiddle region is a chain of sub-tables, one per complex transform
 // length L = 2 nw, nw, ..., 8, each of L/4 doubles and starting at nw - L/2,

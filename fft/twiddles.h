@@ -6,6 +6,7 @@
 #include "fft/complex_ops.h"
 
 namespace fft_internal {
+inline namespace CLIPWEAVER_ISA {
 
 // cos(pi/4), cos(pi/8), sin(pi/8).
 constexpr double kC4 = 0.7071067811865476;
@@ -88,6 +89,7 @@ inline V Square(V w) {
   return UnpackLow(squares, products) + UnpackHigh(Neg(squares), products);
 }
 
+}  // namespace CLIPWEAVER_ISA
 }  // namespace fft_internal
 
 #endif  // CLIPWEAVER_FFT_TWIDDLES_H_

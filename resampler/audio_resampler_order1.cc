@@ -1,7 +1,10 @@
 #include "resampler/audio_resampler_order1.h"
 
+#include <cmath>
 #include <cstring>
 #include <limits>
+
+#include "resampler/stereo_frame.h"
 
 namespace norvane {
 namespace {
@@ -65,7 +68,20 @@ void AudioResamplerOrder1::resampleLayout(int16_t* out, const int16_t* in,
   uint32_t fraction = phaseFraction;
   size_t index = 0;
   uint64_t o = 0;
+  // Gains whose products convert exactly let past the first input frame
+  // take the one-register path.
+  const bool exactGains = std::fabs(left) < 65536.0f && std::fabs(right) < 65536.0f;
+  const StereoGains gains(left, right);
   while (o < outputSampleCount) {
+    if (kInputChannels == 2 && index > 0 && exactGains) {
+      for (; o < outputSampleCount && index < inputFrameCount; o += 2) {
+        MixStereoFrame(out + o, in, 2 * (index - 1), fraction, gains);
+        fraction += increment;
+        index += fraction >> kFractionBits;
+        fraction &= kFractionMask;
+      }
+      break;
+    }
     int32_t olderLeft;
     int32_t olderRight = 0;
     if (index == 0) {

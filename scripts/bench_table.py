@@ -91,6 +91,18 @@ if "clipweaver" in programs:
         ratio = f"{cpu / ref:.2f}x aubiotrack's {ref:.2f} s"
     rows.append(("`clipweaver beats`, 180 s stereo WAV, CPU", f"{cpu:.2f} s (peak {rss:.0f} MiB)", ratio))
 
+path = os.path.join(out, "instructions.txt")
+if os.path.exists(path):
+    with open(path) as f:
+        counts = dict(line.split() for line in f if len(line.split()) == 2)
+    for name, label in [("clipweaver", "AVX kernels"), ("clipweaver-no-avx", "baseline kernels")]:
+        if name in counts:
+            ratio = ""
+            if "aubiotrack" in counts:
+                ratio = f"{int(counts[name]) / int(counts['aubiotrack']):.2f}x aubiotrack's {int(counts['aubiotrack']) / 1e9:.2f} G"
+            rows.append((f"`clipweaver beats`, 180 s stereo WAV, instructions ({label})",
+                         f"{int(counts[name]) / 1e9:.2f} G", ratio))
+
 path = os.path.join(out, "memory.txt")
 if os.path.exists(path):
     with open(path) as f:

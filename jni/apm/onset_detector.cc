@@ -3,7 +3,10 @@
 #include <cmath>
 
 #include "base/float4.h"
+#include "base/instruction_set.h"
 #include "base/logging.h"
+#include "jni/apm/onset_bins.h"
+#include "jni/apm/onset_bins_avx.h"
 
 namespace apm {
 namespace {
@@ -72,40 +75,6 @@ void OnsetDetector::Reset(int32_t bin_count) {
   distances_.resize(bin_count);
 }
 
-// One step for bins k .. k + lanes - 1, lanes being 4 for Float4 and 1 for
-// float; both compute the same bits.
-template <typename V>
-inline void DetectBins(const float* bins, int32_t k, float* previous_magnitude,
-                       float* u1_re, float* u1_im, float* u2_re, float* u2_im,
-                       float* distance) {
-  using simd::Load;
-  V re, im;
-  simd::LoadComplex(bins + 2 * k, &re, &im);
-  const V magnitude = simd::Sqrt(re * re + im * im);
-  // A silent bin gets the phasor (1, 0) of phase 0, as atan2(0, 0) says;
-  // dividing by magnitude + 1 there is dividing by 1.
-  const V silent = simd::OneIfZero(magnitude);
-  const V inverse = simd::Splat<V>(1.0f) / (magnitude + silent);
-  const V u_re = re * inverse + silent;
-  const V u_im = im * inverse;
-  // The phase advanced by the last step: u1 * u1 * conj(u2).
-  const V p1_re = Load<V>(u1_re + k), p1_im = Load<V>(u1_im + k);
-  const V p2_re = Load<V>(u2_re + k), p2_im = Load<V>(u2_im + k);
-  const V a_re = p1_re * p1_re - p1_im * p1_im;
-  const V a_im = simd::Splat<V>(2.0f) * p1_re * p1_im;
-  const V predicted_re = a_re * p2_re + a_im * p2_im;
-  const V predicted_im = a_im * p2_re - a_re * p2_im;
-  const V p = Load<V>(previous_magnitude + k);
-  const V d_re = p * predicted_re - re;
-  const V d_im = p * predicted_im - im;
-  simd::Store(distance + k, simd::Sqrt(d_re * d_re + d_im * d_im));
-  simd::Store(previous_magnitude + k, magnitude);
-  simd::Store(u2_re + k, p1_re);
-  simd::Store(u2_im + k, p1_im);
-  simd::Store(u1_re + k, u_re);
-  simd::Store(u1_im + k, u_im);
-}
-
 float OnsetDetector::DetectFrame(const std::complex<float>* bins) {
   const float* x = reinterpret_cast<const float*>(bins);
   float* state[] = {previous_magnitudes_.data(),
@@ -115,6 +84,12 @@ float OnsetDetector::DetectFrame(const std::complex<float>* bins) {
                     second_previous_phasors_im_.data(),
                     distances_.data()};
   int32_t k = 0;
+#if defined(__x86_64__)
+  if (instruction_set::HasAvx()) {
+    k = DetectBinsAvx(x, bin_count_, state[0], state[1], state[2], state[3],
+                      state[4], state[5]);
+  }
+#endif
   for (; k + 4 <= bin_count_; k += 4) {
     DetectBins<simd::Float4>(x, k, state[0], state[1], state[2], state[3],
                              state[4], state[5]);

@@ -65,11 +65,11 @@ bool Spectrogram::Initialize(const std::vector<double>& window,
   bit_reversal_work_.assign(
       2 + static_cast<int32_t>(std::sqrt(static_cast<double>(fft_length_ / 2))),
       0);
-  sample_queue_.clear();
-  sample_queue_.reserve(static_cast<size_t>(window_length_) +
-                        std::max(step_length_, window_length_));
+  queue_.clear();
+  queue_.reserve(window_length_);
+  queue_start_ = 0;
+  samples_to_skip_ = 0;
   is_initialized_ = true;
-  samples_needed_ = window_length_;
   return true;
 }
 
@@ -94,10 +94,12 @@ bool Spectrogram::ComputeComplexSpectrogram(
       if (progress(fraction)) return false;
     }
     TransformWindow();
-    SpectrogramFrame& bins = output->emplace_back(bin_count_);
+    // Filled as it grows: zeroing it first would be work thrown away.
+    SpectrogramFrame& bins = output->emplace_back();
+    bins.reserve(bin_count_);
     for (int32_t k = 0; k < bin_count_; ++k) {
-      bins[k] = {static_cast<float>(fft_buffer_[2 * k]),
-                 static_cast<float>(fft_buffer_[2 * k + 1])};
+      bins.emplace_back(static_cast<float>(fft_buffer_[2 * k]),
+                        static_cast<float>(fft_buffer_[2 * k + 1]));
     }
     ++frame;
   }
@@ -106,29 +108,39 @@ bool Spectrogram::ComputeComplexSpectrogram(
 
 bool Spectrogram::TakeNextWindow(const float* input, int32_t input_size,
                                  int32_t* input_start) {
-  const int32_t remaining = input_size - *input_start;
-  if (samples_needed_ > remaining) {
-    sample_queue_.insert(sample_queue_.end(), input + *input_start,
-                         input + input_size);
-    *input_start += remaining;
-    samples_needed_ -= remaining;
+  const int32_t skipped = std::min(samples_to_skip_, input_size - *input_start);
+  *input_start += skipped;
+  samples_to_skip_ -= skipped;
+  if (samples_to_skip_ > 0) return false;
+  const int32_t available = input_size - *input_start;
+  const int32_t queued = static_cast<int32_t>(queue_.size()) - queue_start_;
+  if (queued == 0 && available >= window_length_) {
+    window_samples_ = input + *input_start;
+    samples_to_skip_ = step_length_;
+    return true;
+  }
+  queue_.erase(queue_.begin(), queue_.begin() + queue_start_);
+  queue_start_ = 0;
+  const int32_t needed = window_length_ - queued;
+  if (available < needed) {
+    queue_.insert(queue_.end(), input + *input_start, input + input_size);
+    *input_start = input_size;
     return false;
   }
-  sample_queue_.insert(sample_queue_.end(), input + *input_start,
-                       input + *input_start + samples_needed_);
-  *input_start += samples_needed_;
-  if (static_cast<int32_t>(sample_queue_.size()) > window_length_) {
-    sample_queue_.erase(sample_queue_.begin(),
-                        sample_queue_.end() - window_length_);
-  }
-  samples_needed_ = step_length_;
+  queue_.insert(queue_.end(), input + *input_start,
+                input + *input_start + needed);
+  *input_start += needed;
+  window_samples_ = queue_.data();
+  // Kept in place until the next call, since the frame still reads it.
+  queue_start_ = std::min(step_length_, window_length_);
+  samples_to_skip_ = std::max(step_length_ - window_length_, 0);
   return true;
 }
 
 void Spectrogram::TransformWindow() {
-  const double* samples = sample_queue_.data();
+  const float* samples = window_samples_;
   for (int32_t j = 0; j < window_length_; ++j) {
-    fft_buffer_[j] = window_[j] * samples[j];
+    fft_buffer_[j] = window_[j] * static_cast<double>(samples[j]);
   }
   for (int32_t j = window_length_; j < fft_length_; ++j) fft_buffer_[j] = 0.0;
   RealFft(fft_length_, 1, fft_buffer_.data(), bit_reversal_work_.data(),

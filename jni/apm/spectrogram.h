@@ -39,9 +39,11 @@ class Spectrogram {
                                  ProgressCallback progress);
 
   // Streaming steps, for callers that consume frames as they come.
-  // TakeNextWindow queues samples from input[*input_start ..) and returns
-  // true once a whole window is queued; TransformWindow then leaves the
-  // frame's bins in bins() as bin_count() (re, im) pairs of doubles.
+  // TakeNextWindow takes samples from input[*input_start ..) and returns
+  // true once a whole window is there; TransformWindow then leaves the
+  // frame's bins in bins() as bin_count() (re, im) pairs of doubles. A
+  // window that lies whole in `input` is read there, so `input` must stay
+  // put until TransformWindow.
   bool TakeNextWindow(const float* input, int32_t input_size,
                       int32_t* input_start);
   void TransformWindow();
@@ -59,12 +61,15 @@ class Spectrogram {
   int32_t window_length_ = 0;
   int32_t step_length_ = 0;
   bool is_initialized_ = false;
-  int32_t samples_needed_ = 0;
   std::vector<double> window_;
   std::vector<double> fft_buffer_;
-  // The latest samples, oldest first: exactly one window when a frame is
-  // formed. Contiguous, so the window product is one pass over two arrays.
-  std::vector<double> sample_queue_;
+  // Only a window that straddles two inputs is gathered here; queue_[0 ..
+  // queue_start_) belongs to frames already taken.
+  std::vector<float> queue_;
+  int32_t queue_start_ = 0;
+  // Input samples to pass over before the next window begins.
+  int32_t samples_to_skip_ = 0;
+  const float* window_samples_ = nullptr;
   std::vector<int32_t> bit_reversal_work_;
   std::vector<double> twiddle_table_;
 };

@@ -1,0 +1,87 @@
+// The radix-4 pass of complex_fft.h with two neighbouring columns per
+// butterfly: W holds two elements, each half a V, and each half gets the
+// twiddles its own column takes in Radix4Pass, so the bits are the same.
+// Columns pair up as (0, 1), (2, 3), ... below the middle column q/2 and
+// (q/2, q/2 + 1), ... from it on; the second run holds the mirrors q - k,
+// so there the pairs are {k, k - 1} for even k, and the middle column pairs
+// with the mirror of q/2 - 1.
+#ifndef CLIPWEAVER_FFT_PAIRED_RADIX4_H_
+#define CLIPWEAVER_FFT_PAIRED_RADIX4_H_
+
+#include <cstddef>
+
+#include "fft/complex_fft.h"
+#include "fft/complex_ops.h"
+#include "fft/twiddles.h"
+
+namespace fft_internal {
+inline namespace CLIPWEAVER_ISA {
+
+// Turn `low` on the low half of each value and `high` on the high half.
+template <typename TLow, typename THigh>
+struct SplitTurn {
+  template <typename W>
+  Complex2<W> operator()(Complex2<W> x) const {
+    const Complex2<W> l = low(x), h = high(x);
+    return {HighFrom(l.re, h.re), HighFrom(l.im, h.im)};
+  }
+  TLow low;
+  THigh high;
+};
+template <typename TLow, typename THigh>
+SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
+  return {low, high};
+}
+
+template <typename V, typename W>
+void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t) {
+  const std::ptrdiff_t s = length / 2, step = 2 * length;
+  const double* const end = a + 2 * h;
+  const auto column = [&](double* p, auto turn2, auto turn1, auto turn3) {
+    Radix4Column<W>(p, end, step, s, im, turn2, turn1, turn3);
+  };
+  if (length == 8) {
+    column(a, Split(Unturned(), TurnI()), Split(Unturned(), TurnEighth()),
+           Split(Unturned(), TurnThreeEighths()));
+    return;
+  }
+  // Turns of two columns from their w^k and conj(w^3k), one column per
+  // half, or of their mirrors: w^(q - k) = i conj(w^k),
+  // w^2(q - k) = -conj(w^2k), w^3(q - k) = -i conj(w^3k).
+  const auto turns = [](W w1, W w3, bool mirror, auto f) {
+    const W w2 = Square(w1);
+    const W c1 = DupLow(w1), s1 = DupHigh(w1), c2 = DupLow(w2), s2 = DupHigh(w2);
+    const W c3 = DupLow(w3), s3 = DupHigh(w3);
+    if (mirror) {
+      f(Turn<W>{Neg(c2), s2}, Turn<W>{s1, c1}, TurnConj<W>{s3, c3});
+    } else {
+      f(Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
+    }
+  };
+  V previous1 = Splat<V>(0), previous3 = previous1;
+  ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
+    if (k == 1) {
+      turns(Join(w1, w1), Join(w3, w3), false, [&](auto t2, auto t1, auto t3) {
+        column(a, Split(Unturned(), t2), Split(Unturned(), t1), Split(Unturned(), t3));
+      });
+    } else if (k % 2) {
+      turns(Join(previous1, w1), Join(previous3, w3), false,
+            [&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
+    } else {
+      turns(Join(w1, previous1), Join(w3, previous3), true,
+            [&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
+    }
+    previous1 = w1;
+    previous3 = w3;
+  });
+  turns(Join(previous1, previous1), Join(previous3, previous3), true,
+        [&](auto t2, auto t1, auto t3) {
+          column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1),
+                 Split(TurnThreeEighths(), t3));
+        });
+}
+
+}  // namespace CLIPWEAVER_ISA
+}  // namespace fft_internal
+
+#endif  // CLIPWEAVER_FFT_PAIRED_RADIX4_H_
