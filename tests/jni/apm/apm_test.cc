@@ -80,6 +80,8 @@ TEST(ApmModel, TrimGridAndModelLog) {
   EXPECT_TRUE(Logged(fast, "160 value count 2"));
   EXPECT_TRUE(Logged(fast, "161 apmtime count 1"));
   EXPECT_TRUE(Logged(Track({1.0f}, ApmConfig(), 17, false), "159 state count 105"));
+  // A shortest period of one frame is usable.
+  EXPECT_TRUE(Logged(Track({1.0f}, ApmConfig(), 20, false), "159 state count 136"));
 }
 
 TEST(ApmModel, ScoreTablesAndTempoPrior) {
@@ -256,6 +258,9 @@ TEST(ApmRun, UnusableInputOrSetUp) {
   wide_beam.beam_width = 3231;
   ApmConfig no_table;
   no_table.phase_table_size = 0;
+  ApmConfig two_lags;  // a grid needs three
+  two_lags.max_period_ms = 60.0;
+  two_lags.beam_width = 3;
   const std::vector<float> peaks = Peaks(500, 0, 50);
   const std::tuple<std::vector<float>, ApmConfig, int> cases[] = {
       {{}, ApmConfig(), 100},
@@ -268,7 +273,8 @@ TEST(ApmRun, UnusableInputOrSetUp) {
       {peaks, ApmConfig(), 1000},  // too many states for 16 bits
       {peaks, one_lag, 100},
       {peaks, wide_beam, 100},
-      {peaks, no_table, 100}};
+      {peaks, no_table, 100},
+      {peaks, two_lags, 100}};
   int index = 0;
   for (const auto& [detection, config, fps] : cases) {
     Tracked r = Track(detection, config, fps, false);

@@ -6,6 +6,7 @@
 #include <cmath>
 #include <cstdint>
 #include <cstring>
+#include <functional>
 #include <limits>
 #include <vector>
 
@@ -69,8 +70,9 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEachState) {
       lag[k] = next(lags);
       offset[k] = static_cast<int32_t>(next(13)) - 6;
     }
-    // Mostly in the ascending order the beam has.
-    if (round % 5 != 0) std::sort(base.begin(), base.end());
+    // Mostly in the ascending order the beam has; else descending or mixed.
+    if (round % 5 > 1) std::sort(base.begin(), base.end());
+    if (round % 5 == 1) std::sort(base.begin(), base.end(), std::greater<double>());
     std::vector<double> observation(lags);
     std::vector<double> prior(lags);
     for (int j = 0; j < lags; ++j) {

@@ -114,6 +114,11 @@ TEST(AudioAnalyzer, StreamedBlocksGiveTheWholeBufferRun) {
     EXPECT_TRUE(std::is_sorted(run.progress.begin(), run.progress.end())) << announced;
     EXPECT_LE(run.progress.back(), 98);
   }
+  // Nothing fed after an unknown length: nothing to analyse.
+  Outcome empty = Stream({}, rate, 2, 4096, -1);
+  EXPECT_EQ(empty.count, -1);
+  EXPECT_NE(empty.log.find(" Input samples size: 0\n"), std::string::npos);
+  EXPECT_EQ(empty.log.find("Onset"), std::string::npos);
 }
 
 TEST(AudioAnalyzer, ProgressFailuresAndCancellation) {
