@@ -74,32 +74,28 @@ public class AudioResamplerTest {
     AudioResampler.releaseNativeResampler(monoToStereo);
   }
 
-  @ParameterizedTest(name = "{0} channels, stereo output {1}: {2} bytes")
-  @CsvSource({"2, false, 400", "2, true, 400", "1, true, 400", "1, false, 200"})
-  void clearsTwoBytesPerOutputSampleOfTheFramesAsked(int channels, boolean stereo, int bytes) {
-    ByteBuffer context = created(channels, 48000, stereo);
-    byte[] output = filled(1000);
-    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, output, 100, false);
-    byte[] expected = filled(1000);
-    Arrays.fill(expected, 0, bytes, (byte) 0);
-    assertArrayEquals(expected, output);
-    AudioResampler.releaseNativeResampler(context);
-  }
-
-  // 441 input frames at 44100 Hz make 480 output frames at 48000 Hz.
+  // Without input the frames asked are cleared; 441 input frames at 44100 Hz
+  // then write 480 output frames at 48000 Hz.
   @ParameterizedTest(name = "{0} channels, stereo output {1}")
-  @CsvSource({"1, false, 480", "1, true, 960", "2, false, 960"})
-  void writesTheOutputCountOfTheInputFrames(int channels, boolean stereo, int written) {
+  @CsvSource({"2, false, 400, 960", "2, true, 400, 960", "1, true, 400, 960", "1, false, 200, 480"})
+  void clearsTheFramesAskedAndWritesTheOutputCountOfTheInput(
+      int channels, boolean stereo, int cleared, int written) {
     ByteBuffer context = created(channels, 48000, stereo);
+    byte[] output = filled(4000);
+    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, output, 100, false);
+    byte[] expected = filled(4000);
+    Arrays.fill(expected, 0, cleared, (byte) 0);
+    assertArrayEquals(expected, output);
+
     AudioResampler.setSourceSampleRate(context, 44100);
     int[] input = new int[441 * channels];
     Arrays.fill(input, 1000);
-    byte[] output = filled(4000);
+    output = filled(4000);
     AudioResampler.resampleFromByteArray(context, pcm(input), 0, input.length, output, 0, false);
     short[] out = samples(output);
-    int perFrame = written / 480;
-    for (int i = perFrame; i < written; i++) assertNotEquals(FILL_SAMPLE, out[i], "sample " + i);
-    for (int i = written; i < out.length; i++) assertEquals(FILL_SAMPLE, out[i], "sample " + i);
+    for (int i = written / 480; i < out.length; i++) {
+      assertEquals(i >= written, out[i] == FILL_SAMPLE, "sample " + i);
+    }
     AudioResampler.releaseNativeResampler(context);
   }
 
