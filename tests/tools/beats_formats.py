@@ -30,8 +30,8 @@ class TempoAcrossFormats(unittest.TestCase):
                 self.assertGreater(min(steps), 0)
 
     def test_wav_and_flac_of_one_signal_give_the_same_beats(self):
-        [wav] = beats_json(example('same.wav', 100, 48000, 1))
-        [flac] = beats_json(example('same.flac', 100, 48000, 1))
+        [wav, flac] = beats_json(example('f48.wav', 100, 48000, 1),
+                                 example('f48.flac', 100, 48000, 1))
         self.assertEqual({**wav, 'file': ''}, {**flac, 'file': ''})
 
 
