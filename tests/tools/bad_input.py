@@ -1,33 +1,11 @@
 """Refusals: unusable files and command lines, and outputs that would
 destroy data. Each gives its exit status and one line, changes nothing on
 disk, and leaves the other files of a run their results."""
-import hashlib
 import json
 import os
 import unittest
-import wave
 
-from tool_harness import example, main, path, run
-
-
-def silent_wav(name, seconds):
-    with wave.open(path(name), 'wb') as w:
-        w.setnchannels(1)
-        w.setsampwidth(2)
-        w.setframerate(44100)
-        w.writeframes(b'\0\0' * int(seconds * 44100))
-
-
-def snapshot():
-    """Every file under the work directory with its digest."""
-    files = {}
-    for root, _, names in os.walk(path('.')):
-        for name in names:
-            full = os.path.join(root, name)
-            if os.path.isfile(full) and not os.path.islink(full):
-                with open(full, 'rb') as f:
-                    files[full] = hashlib.sha256(f.read()).hexdigest()
-    return files
+from tool_harness import example, main, path, run, silent_wav, snapshot
 
 
 class Refusals(unittest.TestCase):
@@ -40,9 +18,9 @@ class Refusals(unittest.TestCase):
         os.symlink('a.wav', path('a-link.wav'))
         os.makedirs(path('sub/folder.wav'))
         os.mkfifo(path('pipe.wav'))
-        with open(path('notes.wav'), 'wb') as f:
-            f.write(b'just some text\n' * 20)
-        open(path('empty.flac'), 'wb').close()
+        for name, text in (('notes.wav', b'just some text\n' * 20), ('empty.flac', b'')):
+            with open(path(name), 'wb') as f:
+                f.write(text)
         silent_wav('no-frames.wav', 0)
 
     # (arguments, exit status, the line after 'clipweaver: ')
@@ -141,11 +119,9 @@ class Refusals(unittest.TestCase):
         self.assertEqual(len(done.stderr.splitlines()), len(bad))
 
     def test_silence_is_analysed_but_has_no_tempo(self):
-        silent_wav('silence.wav', 3)
-        done = run('beats', '--format', 'json', 'silence.wav')
+        done = run('beats', '--format', 'json', silent_wav('silence.wav', 3))
         self.assertEqual(done.returncode, 0, done.stderr)
-        result = json.loads(done.stdout)
-        self.assertEqual((result['tempo'], result['beats']), (None, []))
+        self.assertEqual([json.loads(done.stdout)[k] for k in ('tempo', 'beats')], [None, []])
 
 
 if __name__ == '__main__':

@@ -22,22 +22,17 @@ class TempoAcrossFormats(unittest.TestCase):
         for name, bpm, rate, channels in self.CASES:
             with self.subTest(name):
                 [result] = beats_json(example(name, bpm, rate, channels))
-                self.assertEqual(result['sample_rate'], rate)
-                self.assertEqual(result['channels'], channels)
-                self.assertAlmostEqual(result['duration'], 20.0, places=3)
+                self.assertEqual((result['sample_rate'], result['channels'], result['duration']),
+                                 (rate, channels, 20.0))
                 self.assertLess(abs(result['tempo'] - bpm) / bpm, 0.01)
-                beats = result['beats']
-                self.assertEqual(beats, sorted(beats))
-                self.assertLessEqual(abs(len(beats) - 20 * bpm / 60), 2)
-                period = 60 / bpm
-                steps = [b - a for a, b in zip(beats, beats[1:])]
-                self.assertLess(abs(statistics.median(steps) - period), 0.02)
+                steps = [b - a for a, b in zip(result['beats'], result['beats'][1:])]
+                self.assertLess(abs(statistics.median(steps) - 60 / bpm), 0.02)
+                self.assertGreater(min(steps), 0)
 
     def test_wav_and_flac_of_one_signal_give_the_same_beats(self):
-        [wav] = beats_json(example('same.wav', 100, 48000, 1))
-        [flac] = beats_json(example('same.flac', 100, 48000, 1))
-        self.assertEqual(wav['beats'], flac['beats'])
-        self.assertEqual(wav['tempo'], flac['tempo'])
+        [wav, flac] = beats_json(example('f48.wav', 100, 48000, 1),
+                                 example('f48.flac', 100, 48000, 1))
+        self.assertEqual({**wav, 'file': ''}, {**flac, 'file': ''})
 
 
 class OutputFormats(unittest.TestCase):
@@ -69,13 +64,6 @@ class OutputFormats(unittest.TestCase):
         for times in ([float(t) for line in text[1:] for t in line.split()],
                       [float(row.split(',')[3]) for row in rows[1:]]):
             self.assertEqual(times, [round(b, 3) for b in result['beats']])
-
-    def test_library_log_reaches_stderr_only_when_verbose(self):
-        groove = example('a.wav', 120)
-        self.assertEqual(run('beats', groove).stderr, '')
-        verbose = run('beats', '--verbose', groove).stderr
-        self.assertIn('native : audio_analyzer.cc:', verbose)
-        self.assertIn('Estimated BPM = 120', verbose)
 
 
 if __name__ == '__main__':

@@ -5,7 +5,6 @@ Screenshots of the pages are left in the work directory.
 import json
 import os
 import unittest
-import wave
 
 from selenium import webdriver
 from selenium.webdriver.chrome.service import Service
@@ -15,7 +14,7 @@ from selenium.webdriver.common.by import By
 from selenium.webdriver.common.keys import Keys
 from selenium.webdriver.support.wait import WebDriverWait
 
-from tool_harness import beats_json, example, main, path, run
+from tool_harness import beats_json, example, main, path, run, silent_wav
 
 FLAGS = ('--headless', '--no-sandbox', '--disable-gpu', '--disable-quic', '--no-first-run',
          '--disable-background-networking', '--disable-component-update', '--disable-sync',
@@ -36,15 +35,6 @@ def setUpModule():
 
 def tearDownModule():
     DRIVER.quit()
-
-
-def silence(name, seconds):
-    with wave.open(path(name), 'wb') as w:
-        w.setnchannels(1)
-        w.setsampwidth(2)
-        w.setframerate(22050)
-        w.writeframes(bytes(2 * 22050 * seconds))
-    return path(name)
 
 
 def page_of(name, seconds, make=example):
@@ -93,7 +83,8 @@ class Pages(unittest.TestCase):
                 ('groove', example, 40, 1_000_000, 0.05),
                 ('five-minutes', example, 300, 6_000_000, 0.05),
                 # A name that HTML would take for markup.
-                ('silence <!--<script>&amp;', silence, 8, 200_000, 0.001),
+                ('silence <!--<script>&amp;', lambda n, seconds: silent_wav(n, seconds, 22050), 3,
+                 100_000, 0.001),
                 ('mono-96k', lambda n, seconds: example(n, 90, 96000, 1, seconds),
                  12, 500_000, 0.05)):
             with self.subTest(name):

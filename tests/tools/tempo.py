@@ -22,13 +22,6 @@ class TempoRange(unittest.TestCase):
                 self.assertAlmostEqual(ranged['tracker_tempo'],
                                        6000 / round(6000 / bpm), places=3)
 
-    def test_the_trackers_own_range_changes_nothing(self):
-        for rate in (44100, 22050):
-            groove = example('groove120-%d.wav' % rate, 120, rate, 1, seconds=8)
-            with self.subTest(rate=rate):
-                self.assertEqual(run('beats', groove).stdout,
-                                 run('beats', '--tempo', '75-1200', groove).stdout)
-
     def test_bad_ranges_are_refused_before_any_analysis(self):
         groove = example('groove120.wav', 120, seconds=4)
         slow = example('groove22k.wav', 120, 22050, 1, seconds=4)

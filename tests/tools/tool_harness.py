@@ -3,6 +3,7 @@
 Each suite runs as: python3 SUITE.py PATH/TO/clipweaver WORK_DIR
 """
 import array
+import hashlib
 import json
 import os
 import resource
@@ -58,6 +59,27 @@ def example(name, bpm=120, rate=44100, channels=2, seconds=20):
                    '--channels', channels, '--seconds', seconds)
         assert done.returncode == 0, done.stderr
     return target
+
+
+def snapshot():
+    """Every file under the work directory with its digest."""
+    files = {}
+    for root, _, names in os.walk(WORK):
+        for name in names:
+            full = os.path.join(root, name)
+            if os.path.isfile(full) and not os.path.islink(full):
+                with open(full, 'rb') as f:
+                    files[os.path.relpath(full, WORK)] = hashlib.sha256(f.read()).hexdigest()
+    return files
+
+
+def silent_wav(name, seconds, rate=44100):
+    with wave.open(path(name), 'wb') as w:
+        w.setnchannels(1)
+        w.setsampwidth(2)
+        w.setframerate(rate)
+        w.writeframes(b'\0\0' * int(seconds * rate))
+    return path(name)
 
 
 def beats_json(*args):

@@ -15,6 +15,7 @@ import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.List;
 import org.junit.jupiter.api.Test;
+import org.junit.jupiter.api.function.Executable;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
 
@@ -59,47 +60,40 @@ public class AudioResamplerTest {
   @Test
   void contextHoldsInstanceChannelCountAndStereoFlag() {
     assertEquals(16, AudioResampler.getNativeResamplerContextSize());
-    ByteBuffer stereo = context();
-    for (int i = 13; i < 16; i++) stereo.put(i, (byte) 0x5a);
-    AudioResampler.createNativeResampler(stereo, 2, 2, 48000, false);
-    assertNotEquals(0L, stereo.getLong(0));
-    assertEquals(2, stereo.getInt(8));
-    assertEquals(0, stereo.get(12));
-    for (int i = 13; i < 16; i++) assertEquals(0x5a, stereo.get(i), "reserved byte " + i);
-
-    ByteBuffer monoToStereo = created(1, 44100, true);
-    assertEquals(1, monoToStereo.getInt(8));
-    assertEquals(1, monoToStereo.get(12));
-    AudioResampler.releaseNativeResampler(stereo);
-    AudioResampler.releaseNativeResampler(monoToStereo);
+    for (int channels = 1; channels <= 2; channels++) {
+      ByteBuffer context = context();
+      for (int i = 12; i < 16; i++) context.put(i, (byte) 0x5a);
+      AudioResampler.createNativeResampler(context, 2, channels, 48000, channels == 1);
+      assertNotEquals(0L, context.getLong(0));
+      assertEquals(channels, context.getInt(8));
+      assertEquals(channels == 1 ? 1 : 0, context.get(12));
+      for (int i = 13; i < 16; i++) assertEquals(0x5a, context.get(i), "reserved byte " + i);
+      AudioResampler.releaseNativeResampler(context);
+    }
   }
 
-  @ParameterizedTest(name = "{0} channels, stereo output {1}: {2} bytes")
-  @CsvSource({"2, false, 400", "2, true, 400", "1, true, 400", "1, false, 200"})
-  void clearsTwoBytesPerOutputSampleOfTheFramesAsked(int channels, boolean stereo, int bytes) {
-    ByteBuffer context = created(channels, 48000, stereo);
-    byte[] output = filled(1000);
-    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, output, 100, false);
-    byte[] expected = filled(1000);
-    Arrays.fill(expected, 0, bytes, (byte) 0);
-    assertArrayEquals(expected, output);
-    AudioResampler.releaseNativeResampler(context);
-  }
-
-  // 441 input frames at 44100 Hz make 480 output frames at 48000 Hz.
+  // Without input the frames asked are cleared; 441 input frames at 44100 Hz
+  // then write 480 output frames at 48000 Hz.
   @ParameterizedTest(name = "{0} channels, stereo output {1}")
-  @CsvSource({"1, false, 480", "1, true, 960", "2, false, 960"})
-  void writesTheOutputCountOfTheInputFrames(int channels, boolean stereo, int written) {
+  @CsvSource({"2, false, 400, 960", "2, true, 400, 960", "1, true, 400, 960", "1, false, 200, 480"})
+  void clearsTheFramesAskedAndWritesTheOutputCountOfTheInput(
+      int channels, boolean stereo, int cleared, int written) {
     ByteBuffer context = created(channels, 48000, stereo);
+    byte[] output = filled(4000);
+    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, output, 100, false);
+    byte[] expected = filled(4000);
+    Arrays.fill(expected, 0, cleared, (byte) 0);
+    assertArrayEquals(expected, output);
+
     AudioResampler.setSourceSampleRate(context, 44100);
     int[] input = new int[441 * channels];
     Arrays.fill(input, 1000);
-    byte[] output = filled(4000);
+    output = filled(4000);
     AudioResampler.resampleFromByteArray(context, pcm(input), 0, input.length, output, 0, false);
     short[] out = samples(output);
-    int perFrame = written / 480;
-    for (int i = perFrame; i < written; i++) assertNotEquals(FILL_SAMPLE, out[i], "sample " + i);
-    for (int i = written; i < out.length; i++) assertEquals(FILL_SAMPLE, out[i], "sample " + i);
+    for (int i = written / 480; i < out.length; i++) {
+      assertEquals(i >= written, out[i] == FILL_SAMPLE, "sample " + i);
+    }
     AudioResampler.releaseNativeResampler(context);
   }
 
@@ -259,23 +253,25 @@ public class AudioResamplerTest {
 
   @Test
   void wrapperRejectsBadArgumentsBeforeTheNativeCall() {
-    assertThrows(IllegalArgumentException.class, () -> new AudioResampler(3, 48000, false));
-    assertThrows(IllegalArgumentException.class, () -> new AudioResampler(1, 0, false));
     AudioResampler resampler = new AudioResampler(1, 16000, true);
     assertEquals(2, resampler.getOutputChannelCount());
-    assertThrows(IllegalArgumentException.class, () -> resampler.setSourceSampleRate(0));
-    assertThrows(IllegalArgumentException.class, () -> resampler.setSourceSampleRate(48001));
     resampler.setSourceSampleRate(48000);
     assertEquals(48000, resampler.getSourceSampleRate());
     byte[] input = new byte[960];
-    assertThrows(IndexOutOfBoundsException.class,
-        () -> resampler.resample(input, 2, 480, new byte[640], 0, true));
-    assertThrows(IndexOutOfBoundsException.class,
-        () -> resampler.resample(input, 0, 480, new byte[639], 0, true));
-    assertThrows(IndexOutOfBoundsException.class,
-        () -> resampler.resample(input, 0, 0, new byte[640], 161, false));
-    assertThrows(IllegalArgumentException.class,
-        () -> resampler.resample(ByteBuffer.wrap(input), 0, 480, new byte[640], 0, true));
+    for (Executable call : new Executable[] {
+        () -> new AudioResampler(3, 48000, false),
+        () -> new AudioResampler(1, 0, false),
+        () -> resampler.setSourceSampleRate(0),
+        () -> resampler.setSourceSampleRate(48001),
+        () -> resampler.resample(ByteBuffer.wrap(input), 0, 480, new byte[640], 0, true)}) {
+      assertThrows(IllegalArgumentException.class, call);
+    }
+    for (Executable call : new Executable[] {
+        () -> resampler.resample(input, 2, 480, new byte[640], 0, true),
+        () -> resampler.resample(input, 0, 480, new byte[639], 0, true),
+        () -> resampler.resample(input, 0, 0, new byte[640], 161, false)}) {
+      assertThrows(IndexOutOfBoundsException.class, call);
+    }
     resampler.resample(input, 0, 480, new byte[640], 160, false);
     resampler.close();
     resampler.close();

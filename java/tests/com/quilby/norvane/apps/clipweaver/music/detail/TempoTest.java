@@ -13,9 +13,21 @@ import java.util.Random;
 import org.junit.jupiter.api.Test;
 
 class TempoTest {
-  private static float[] steady(int count, double period, double start) {
-    float[] beats = new float[count];
-    for (int i = 0; i < count; i++) beats[i] = (float) (start + i * period);
+  // Beats from `start` on, in runs of (count, period), each run following the last beat.
+  private static float[] beats(double start, double... runs) {
+    List<Double> times = new ArrayList<>(List.of(start));
+    for (int r = 0; r < runs.length; r += 2) {
+      double from = times.get(times.size() - 1);
+      for (int i = 1; i <= runs[r]; i++) times.add(from + i * runs[r + 1]);
+    }
+    float[] out = new float[times.size()];
+    for (int i = 0; i < out.length; i++) out[i] = (float) (double) times.get(i);
+    return out;
+  }
+
+  private static float[] jittered(float[] beats, double jitter) {
+    Random random = new Random(7);
+    for (int i = 0; i < beats.length; i++) beats[i] += (float) (random.nextGaussian() * jitter);
     return beats;
   }
 
@@ -25,29 +37,6 @@ class TempoTest {
     return out;
   }
 
-  private static float[] jittered(int count, double period, double jitter) {
-    Random random = new Random(7);
-    float[] beats = steady(count, period, 0.3);
-    for (int i = 0; i < count; i++) beats[i] += (float) (random.nextGaussian() * jitter);
-    return beats;
-  }
-
-  private static float[] tempoChange() {
-    float[] slow = steady(40, 0.6, 0.3);
-    float[] fast = steady(60, 60.0 / 130, slow[39] + 60.0 / 130);
-    float[] beats = new float[100];
-    System.arraycopy(slow, 0, beats, 0, 40);
-    System.arraycopy(fast, 0, beats, 40, 60);
-    return beats;
-  }
-
-  // Eight beats at 0.56 s before the tracker locks on 0.6 s.
-  private static float[] settling() {
-    float[] beats = new float[48];
-    for (int i = 0; i < 48; i++) beats[i] = (float) (i < 8 ? i * 0.56 : 7 * 0.56 + (i - 7) * 0.6);
-    return beats;
-  }
-
   private record Row(String name, float[] beats, double bpm, double tolerance) {}
 
   // Float beat times, as the extractor returns them, cost some precision.
@@ -55,13 +44,13 @@ class TempoTest {
   void preciseTempoOfBeatLists() {
     for (Row row :
         List.of(
-            new Row("steady", steady(30, 0.5, 0.3), 120, 1e-3),
-            new Row("jittered by 10 ms", jittered(80, 0.5, 0.01), 120, 0.3),
-            new Row("one beat missing", without(steady(30, 0.5, 0.3), 12), 120, 1e-3),
-            new Row("tempo change: the longer part", tempoChange(), 130, 1e-3),
-            new Row("three beats", steady(3, 0.4, 0.3), 150, 1e-3),
-            new Row("settling at 107 BPM first", settling(), 100, 0.03),
-            new Row("two beats", steady(2, 0.5, 0.3), Double.NaN, 0),
+            new Row("steady", beats(0.3, 29, 0.5), 120, 1e-3),
+            new Row("jittered by 10 ms", jittered(beats(0.3, 79, 0.5), 0.01), 120, 0.3),
+            new Row("one beat missing", without(beats(0.3, 29, 0.5), 12), 120, 1e-3),
+            new Row("tempo change: the longer part", beats(0.3, 39, 0.6, 60, 60 / 130.0), 130, 1e-3),
+            new Row("three beats", beats(0.3, 2, 0.4), 150, 1e-3),
+            new Row("settling at 107 BPM first", beats(0, 7, 0.56, 40, 0.6), 100, 0.03),
+            new Row("two beats", beats(0.3, 1, 0.5), Double.NaN, 0),
             new Row("nothing steady", new float[] {0, 0.5f, 1.3f, 1.6f, 2.7f, 3f}, Double.NaN, 0))) {
       assertEquals(row.bpm, Tempo.precise(row.beats), row.tolerance, row.name);
     }

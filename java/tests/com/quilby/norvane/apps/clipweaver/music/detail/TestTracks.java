@@ -8,12 +8,7 @@ import java.util.Random;
 final class TestTracks {
   private TestTracks() {}
 
-  /**
-   * A groove of kicks on every beat, a snare on beats 2 and 4 and hi-hats on
-   * the off-beats, starting with a kick at time 0.
-   *
-   * @return interleaved 16-bit PCM, all channels equal
-   */
+  /** Kicks on every beat from time 0, snares on 2 and 4, hi-hats off the beat; channels equal. */
   static short[] groove(double seconds, int sampleRate, int channels, double bpm) {
     int frames = (int) Math.round(seconds * sampleRate);
     double[] mono = new double[frames];
@@ -58,13 +53,6 @@ final class TestTracks {
     ByteBuffer buffer = ByteBuffer.allocateDirect(pcm.length * 2).order(ByteOrder.LITTLE_ENDIAN);
     buffer.asShortBuffer().put(pcm);
     return buffer;
-  }
-
-  /** Every channel-th sample starting at channel 0. */
-  static short[] firstChannel(short[] pcm, int channels) {
-    short[] mono = new short[pcm.length / channels];
-    for (int i = 0; i < mono.length; i++) mono[i] = pcm[i * channels];
-    return mono;
   }
 
   static double medianInterval(float[] beats) {
