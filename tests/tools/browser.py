@@ -83,8 +83,8 @@ class Pages(unittest.TestCase):
                 ('groove', example, 40, 1_000_000, 0.05),
                 ('five-minutes', example, 300, 6_000_000, 0.05),
                 # A name that HTML would take for markup.
-                ('silence <!--<script>&amp;', lambda n, seconds: silent_wav(n, seconds, 22050), 3,
-                 100_000, 0.001),
+                ('silence <!--<script>&amp;', lambda n, seconds: silent_wav(n, seconds, 22050), 8,
+                 200_000, 0.001),
                 ('mono-96k', lambda n, seconds: example(n, 90, 96000, 1, seconds),
                  12, 500_000, 0.05)):
             with self.subTest(name):
