@@ -10,17 +10,6 @@ namespace {
 
 const ProgressCallback kNoProgress = [](float) { return false; };
 
-// Frames of a steady tone: constant magnitudes, phases advancing linearly.
-std::vector<SpectrogramFrame> SteadyTone(int frames, int bins) {
-  std::vector<SpectrogramFrame> spectrogram(frames, SpectrogramFrame(bins));
-  for (int t = 0; t < frames; ++t) {
-    for (int k = 0; k < bins; ++k) {
-      spectrogram[t][k] = std::polar(10.0f + k, 0.3f * k * t + 0.1f * k);
-    }
-  }
-  return spectrogram;
-}
-
 TEST(OnsetDetector, EmptySpectrogramIsAnError) {
   OnsetDetector detector;
   std::vector<float> values = {7.0f};
@@ -37,18 +26,6 @@ TEST(OnsetDetector, EmptySpectrogramIsAnError) {
 TEST(OnsetDetector, ValuesFollowThePhasePrediction) {
   OnsetDetector detector;
   std::vector<float> values;
-  // Silence, then a steady tone: zeros, then a settling tone near zero.
-  std::vector<SpectrogramFrame> spectrogram(3, SpectrogramFrame(5));
-  const auto tone = SteadyTone(10, 5);
-  spectrogram.insert(spectrogram.end(), tone.begin(), tone.end());
-  ASSERT_TRUE(detector.ComputeDetectionFunction(spectrogram, &values, kNoProgress, true));
-  ASSERT_EQ(values.size(), 13u);
-  for (int t = 0; t < 3; ++t) EXPECT_EQ(values[t], 0.0f);
-  double magnitudes = 0;
-  for (const auto& bin : tone[0]) magnitudes += std::abs(bin);
-  EXPECT_NEAR(values[3], magnitudes, 1e-4 * magnitudes);
-  for (int t = 5; t < 13; ++t) EXPECT_LT(values[t], 1e-3 * magnitudes) << t;
-
   // Phase -pi stands in for the frame before the first: 1 then predicts -1
   // (|i + 1| = sqrt 2 from i), and phases 0, pi/2 predict -1, met exactly.
   ASSERT_TRUE(detector.ComputeDetectionFunction({{{1, 0}}, {{0, 1}}, {{-1, 0}}}, &values,
@@ -81,7 +58,7 @@ TEST(OnsetDetector, EveryLaneWidthGivesTheSameBits) {
 }
 
 TEST(OnsetDetector, ProgressCancellationAndAppending) {
-  const auto spectrogram = SteadyTone(250, 4);
+  const std::vector<SpectrogramFrame> spectrogram(250, SpectrogramFrame(4, {1, 2}));
   OnsetDetector detector;
   std::vector<float> reports, values = {1.0f, 2.0f};
   ASSERT_TRUE(detector.ComputeDetectionFunction(

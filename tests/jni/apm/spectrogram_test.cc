@@ -55,20 +55,6 @@ TEST(Spectrogram, RejectsBadSettingsAndRecovers) {
   EXPECT_EQ(frames.size(), 1u);
 }
 
-TEST(Spectrogram, FrameGridAndQueuedRemainder) {
-  const int32_t w = 1764, s = 441;
-  Spectrogram spectrogram;
-  std::vector<SpectrogramFrame> frames;
-  for (auto [count, expected] : {std::pair{w - 1, 0}, {w, 1}, {w + s - 1, 1},
-                                 {w + s, 2}, {w + 10 * s + 7, 11}}) {
-    ASSERT_TRUE(spectrogram.Initialize(w, s));
-    ASSERT_TRUE(spectrogram.ComputeComplexSpectrogram(Noise(count, 1), &frames,
-                                                      kNoProgress));
-    EXPECT_EQ(static_cast<int>(frames.size()), expected) << count;
-    for (const auto& frame : frames) EXPECT_EQ(frame.size(), 1025u);
-  }
-}
-
 // Windows read in place, gathered across pieces, and skipped over when the
 // step is longer than the window all give the same frames; samples no
 // window covers are never read.
