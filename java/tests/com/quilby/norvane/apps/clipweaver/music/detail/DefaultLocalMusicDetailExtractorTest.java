@@ -8,6 +8,7 @@ import static org.junit.jupiter.api.Assertions.assertTrue;
 import com.quilby.norvane.apps.clipweaver.testing.ChildJvm;
 import java.lang.reflect.Method;
 import java.nio.ByteBuffer;
+import java.nio.ByteOrder;
 import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.List;
@@ -139,6 +140,14 @@ class DefaultLocalMusicDetailExtractorTest {
     assertEquals(plain, ranged);
     assertEquals(0, new DefaultLocalMusicDetailExtractor(p -> true)
         .calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1, 75, 1200).length);
+  }
+
+  // A lone burst 0.2 s into 0.4 s of silence: one beat, on the burst's frame.
+  @Test
+  void aLoneBurstGetsItsOneBeat() {
+    ByteBuffer pcm = ByteBuffer.allocateDirect(2 * 17640).order(ByteOrder.LITTLE_ENDIAN);
+    for (int i = 0; i < 200; i++) pcm.putShort(2 * (8820 + i), (short) (i % 2 == 1 ? 20000 : -20000));
+    assertArrayEquals(new float[] {0.17f}, beatsOf(pcm, 44100, 1));
   }
 
   @Test
