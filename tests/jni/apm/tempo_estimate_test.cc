@@ -52,6 +52,7 @@ TEST(PreciseTempo, BeatLists) {
       {"one beat missing", WithoutBeat(Steady(30, 0.5), 12), 120, 1e-9},
       {"first beat missing", WithoutBeat(Steady(30, 0.5), 1), 120, 1e-9},
       {"tempo change: the longer part", Steady(60, 60.0 / 130, Steady(40, 0.6)), 130, 1e-9},
+      {"tempo change: the longer part first", Steady(40, 0.6, Steady(60, 60.0 / 130)), 130, 1e-9},
       // A tracker settling at a shorter period before it locks on stays out
       // of the fit but for its last beat, 40 ms off the line: fitted whole,
       // the run would read 100.44 BPM.
