@@ -100,8 +100,7 @@ void TransitionScorer::SetUp(int32_t lag_count, int32_t offset_range,
     period_gain_ = std::max(period_gain_, period_[d] - period_.back());
     near_at_least_tail_ &= period_[d] >= period_.back();
   }
-  seen_.assign(static_cast<size_t>(lag_count) * (phase_tail_ + 1), 0);
-  generation_ = 0;
+  seen_.Reset(static_cast<size_t>(lag_count) * (phase_tail_ + 1));
 }
 
 bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
@@ -185,10 +184,7 @@ void TransitionScorer::Order(const BeamEntries& entries) {
 }
 
 void TransitionScorer::Keep() {
-  if (++generation_ == 0) {
-    std::fill(seen_.begin(), seen_.end(), 0);
-    generation_ = 1;
-  }
+  seen_.NextGeneration();
   const int32_t count = static_cast<int32_t>(sorted_.size());
   if (kept_.size() < sorted_.size()) kept_.resize(sorted_.size());
   const int32_t class_count = phase_tail_ + 1;
@@ -200,10 +196,8 @@ void TransitionScorer::Keep() {
         (i > 0 && sorted_[i - 1].base - e.base <= delta_) |
         (i + 1 < count && e.base - sorted_[i + 1].base <= delta_);
     const int32_t phase_class = std::min(std::abs(e.offset), phase_tail_);
-    uint32_t& seen =
-        seen_[static_cast<size_t>(e.lag) * class_count + phase_class];
-    const bool first = seen != generation_;
-    seen = generation_;
+    const bool first =
+        seen_.Mark(static_cast<size_t>(e.lag) * class_count + phase_class);
     // Written in any case, counted only when kept: fewer branches.
     kept_[kept] = {e.base, e.lag, phase_class, e.entry, crowded};
     class_start_[phase_class + 1] += first | crowded;

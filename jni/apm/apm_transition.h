@@ -9,6 +9,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "jni/apm/generation_marks.h"
+
 namespace apm {
 
 // The beam of a frame, entry k in beam order: its base score (beat bonus
@@ -110,8 +112,7 @@ class TransitionScorer {
   std::vector<int32_t> class_start_;
   std::vector<int32_t> fill_;
   // Stamps of the (lag, phase class) groups already met in this call.
-  std::vector<uint32_t> seen_;
-  uint32_t generation_ = 0;
+  GenerationMarks seen_;
 };
 
 }  // namespace apm

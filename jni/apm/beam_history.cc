@@ -24,8 +24,7 @@ void BeamHistory::Reset(int32_t width, int32_t frame_count,
   broken_.clear();
   position_.assign(static_cast<size_t>(kNoPredecessor) + 1, -1);
   // One more, for -1.
-  way_mark_.assign(static_cast<size_t>(kNoPredecessor) + 2, 0);
-  generation_ = 0;
+  way_mark_.Reset(static_cast<size_t>(kNoPredecessor) + 2);
 }
 
 const uint16_t* BeamHistory::states(int32_t t) const {
@@ -76,19 +75,8 @@ bool BeamHistory::WasBroken(int32_t t) const {
   return std::binary_search(broken_.begin(), broken_.end(), t);
 }
 
-void BeamHistory::NextGeneration() {
-  if (++generation_ == 0) {
-    std::fill(way_mark_.begin(), way_mark_.end(), 0);
-    generation_ = 1;
-  }
-}
-
 void BeamHistory::AddWay(int32_t state, std::vector<int32_t>* ways) {
-  uint32_t& mark = way_mark_[static_cast<size_t>(state + 1)];
-  if (mark != generation_) {
-    mark = generation_;
-    ways->push_back(state);
-  }
+  if (way_mark_.Mark(static_cast<size_t>(state + 1))) ways->push_back(state);
 }
 
 int32_t BeamHistory::StepBack(int32_t t, int32_t s) const {
@@ -101,7 +89,7 @@ int32_t BeamHistory::StepBack(int32_t t, int32_t s) const {
 // it in the predecessor of one of the row's entries; those ways back are
 // followed down until they meet.
 void BeamHistory::CheckForMerge() {
-  NextGeneration();
+  way_mark_.NextGeneration();
   ways_.clear();
   const uint16_t* newest = predecessors(last_row_);
   for (int32_t k = 0; k < width_; ++k) {
@@ -115,7 +103,7 @@ void BeamHistory::CheckForMerge() {
     const uint16_t* row = states(t);
     // Backwards, so that a state found twice keeps its first position.
     for (int32_t k = width_ - 1; k >= 0; --k) position_[row[k]] = k;
-    NextGeneration();
+    way_mark_.NextGeneration();
     next_ways_.clear();
     for (const int32_t s : ways_) AddWay(StepBack(t, s), &next_ways_);
     for (int32_t k = 0; k < width_; ++k) position_[row[k]] = -1;

@@ -20,6 +20,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "jni/apm/generation_marks.h"
+
 namespace apm {
 
 // States are kept in 16 bits; this value stands for "no predecessor", so a
@@ -56,8 +58,8 @@ class BeamHistory {
   const uint16_t* predecessors(int32_t t) const;
   // The state before a way back that enters row t in state s.
   int32_t StepBack(int32_t t, int32_t s) const;
-  void NextGeneration();
-  // Adds state to ways unless it was added since the last NextGeneration.
+  // Adds state to ways unless it was added since the way marks' last
+  // generation began.
   void AddWay(int32_t state, std::vector<int32_t>* ways);
   void CheckForMerge();
   void Settle(int32_t merge_row, int32_t state);
@@ -79,8 +81,7 @@ class BeamHistory {
   std::vector<int32_t> position_;
   std::vector<int32_t> ways_;
   std::vector<int32_t> next_ways_;
-  std::vector<uint32_t> way_mark_;
-  uint32_t generation_ = 0;
+  GenerationMarks way_mark_;
 };
 
 }  // namespace apm

@@ -1,0 +1,43 @@
+// A set of marks that one step forgets whole: each mark holds the generation
+// it was made in, so a new generation clears them all without a pass.
+#ifndef CLIPWEAVER_JNI_APM_GENERATION_MARKS_H_
+#define CLIPWEAVER_JNI_APM_GENERATION_MARKS_H_
+
+#include <algorithm>
+#include <cstddef>
+#include <cstdint>
+#include <vector>
+
+namespace apm {
+
+class GenerationMarks {
+ public:
+  void Reset(size_t size) {
+    marks_.assign(size, 0);
+    generation_ = 0;
+  }
+
+  // Generation 0 stands for "never marked", so a wrap clears for real.
+  void NextGeneration() {
+    if (++generation_ == 0) {
+      std::fill(marks_.begin(), marks_.end(), 0);
+      generation_ = 1;
+    }
+  }
+
+  // True when index was not yet marked in this generation; marks it.
+  bool Mark(size_t index) {
+    uint32_t& mark = marks_[index];
+    const bool first = mark != generation_;
+    mark = generation_;
+    return first;
+  }
+
+ private:
+  std::vector<uint32_t> marks_;
+  uint32_t generation_ = 0;
+};
+
+}  // namespace apm
+
+#endif  // CLIPWEAVER_JNI_APM_GENERATION_MARKS_H_
