@@ -13,9 +13,9 @@
 
 #include <cmath>
 
-#if defined(__SSE2__)
+#if defined(CLIPWEAVER_SSE2)
 #include <emmintrin.h>
-#elif defined(__ARM_NEON) && defined(__aarch64__)
+#elif defined(CLIPWEAVER_NEON)
 #include <arm_neon.h>
 #endif
 
@@ -45,7 +45,7 @@ inline void LoadComplex(const float* p, float* re, float* im) {
   *im = p[1];
 }
 
-#if defined(__SSE2__)
+#if defined(CLIPWEAVER_SSE2)
 
 struct Float4 {
   __m128 v;
@@ -74,7 +74,7 @@ inline void LoadComplex(const float* p, Float4* re, Float4* im) {
   im->v = _mm_shuffle_ps(low, high, _MM_SHUFFLE(3, 1, 3, 1));
 }
 
-#elif defined(__ARM_NEON) && defined(__aarch64__)
+#elif defined(CLIPWEAVER_NEON)
 
 struct Float4 {
   float32x4_t v;

@@ -8,6 +8,17 @@
 #ifndef CLIPWEAVER_BASE_INSTRUCTION_SET_H_
 #define CLIPWEAVER_BASE_INSTRUCTION_SET_H_
 
+// The vector vocabularies take SSE2 or NEON where the target has them. A
+// build defining CLIPWEAVER_PLAIN_VECTORS takes their plain-array forms, the
+// ones other targets (32-bit ARM among them) run, so that any machine can
+// test those too.
+#if defined(CLIPWEAVER_PLAIN_VECTORS)
+#elif defined(__SSE2__)
+#define CLIPWEAVER_SSE2 1
+#elif defined(__ARM_NEON) && defined(__aarch64__)
+#define CLIPWEAVER_NEON 1
+#endif
+
 #if defined(__AVX__)
 #define CLIPWEAVER_ISA isa_avx
 #else

@@ -8,9 +8,9 @@
 
 #include "base/instruction_set.h"
 
-#if defined(__SSE2__)
+#if defined(CLIPWEAVER_SSE2)
 #include <emmintrin.h>
-#elif defined(__ARM_NEON) && defined(__aarch64__)
+#elif defined(CLIPWEAVER_NEON)
 #include <arm_neon.h>
 #endif
 
@@ -53,7 +53,7 @@ inline PlainDouble2 DupHigh(PlainDouble2 a) { return {a.hi, a.hi}; }
 inline PlainDouble2 UnpackLow(PlainDouble2 a, PlainDouble2 b) { return {a.lo, b.lo}; }
 inline PlainDouble2 UnpackHigh(PlainDouble2 a, PlainDouble2 b) { return {a.hi, b.hi}; }
 
-#if defined(__SSE2__)
+#if defined(CLIPWEAVER_SSE2)
 
 struct Double2 {
   __m128d v;
@@ -84,7 +84,7 @@ inline Double2 DupHigh(Double2 a) { return {_mm_unpackhi_pd(a.v, a.v)}; }
 inline Double2 UnpackLow(Double2 a, Double2 b) { return {_mm_unpacklo_pd(a.v, b.v)}; }
 inline Double2 UnpackHigh(Double2 a, Double2 b) { return {_mm_unpackhi_pd(a.v, b.v)}; }
 
-#elif defined(__ARM_NEON) && defined(__aarch64__)
+#elif defined(CLIPWEAVER_NEON)
 
 struct Double2 {
   float64x2_t v;

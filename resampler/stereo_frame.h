@@ -10,13 +10,15 @@
 #include <cstdint>
 #include <cstring>
 
-#if defined(__SSE2__)
+#include "base/instruction_set.h"
+
+#if defined(CLIPWEAVER_SSE2)
 #include <emmintrin.h>
 #endif
 
 namespace norvane {
 
-#if defined(__SSE2__)
+#if defined(CLIPWEAVER_SSE2)
 
 struct StereoGains {
   explicit StereoGains(float left, float right) : v(_mm_setr_ps(left, right, 0, 0)) {}
