@@ -42,6 +42,7 @@ TEST(Threads, AnalysesAndResamplersMatchTheirSingleThreadedResults) {
   for (int i = 0; i < kThreads; ++i) {
     tracks.push_back(test_signals::Clicks(8000, 1, 6, 0.4 + 0.05 * i));
     beats.push_back(Beats(tracks[i], 8000));
+    ASSERT_FALSE(beats[i].empty()) << i;
     resampled.push_back(Resampled(48000 - 4000 * i));
   }
   testing::internal::CaptureStderr();
@@ -57,9 +58,6 @@ TEST(Threads, AnalysesAndResamplersMatchTheirSingleThreadedResults) {
   }
   for (std::thread& thread : threads) thread.join();
   testing::internal::GetCapturedStderr();
-  for (int i = 0; i < kThreads; ++i) {
-    EXPECT_FALSE(beats[i].empty()) << i;
-  }
   EXPECT_EQ(mismatches, std::vector<int>(kThreads, 0));
   EXPECT_EQ(norvane::AudioResampler::getCurrentLoadMHz(), load_before);
 }

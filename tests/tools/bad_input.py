@@ -107,13 +107,17 @@ class Refusals(unittest.TestCase):
             os.chmod(path('b.wav'), 0o644)
         self.assertEqual(done.stderr, 'clipweaver: b.wav: unreadable: permission denied\n')
 
-    def test_good_files_among_bad_ones_still_get_their_beats(self):
+    def test_good_files_among_bad_ones_get_their_beats_in_argument_order(self):
         bad = [args[1] for args, status, _ in self.CASES
                if status == 1 and args[0] == 'beats']
-        done = run('beats', '-j3', '--format', 'json', *bad[:3], 'a.wav', *bad[3:])
+        files = bad[:3] + ['a.wav', 'b.wav'] + bad[3:]
+        done = run('beats', '-j3', '--format', 'json', *files)
         self.assertEqual(done.returncode, 1)
+        self.assertEqual(done.stdout, run('beats', '-j1', '--format', 'json', *files).stdout)
         results = [json.loads(line) for line in done.stdout.splitlines()]
-        self.assertEqual([r['file'] for r in results], bad[:3] + ['a.wav'] + bad[3:])
+        self.assertEqual([r['file'] for r in results], files)
+        self.assertEqual(set(results[3]), {'file', 'duration', 'sample_rate', 'channels',
+                                           'tempo', 'tracker_tempo', 'beats'})
         self.assertEqual((results[3]['tempo'], results[3]['tracker_tempo']), (120.0, 120.0))
         self.assertEqual(results[0], {'file': 'missing.wav', 'error': 'no such file'})
         self.assertEqual(len(done.stderr.splitlines()), len(bad))
