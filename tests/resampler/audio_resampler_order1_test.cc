@@ -90,23 +90,16 @@ uint64_t StreamDigest(int channels, bool stereoOutput, int32_t outputRate) {
   auto r = Make(channels, outputRate, outputRate, 1.0f, 1.0f, stereoOutput);
   Digest digest;
   for (int block = 0; block < 600; ++block) {
-    switch (uniform(0, 9)) {
-      case 0: {
-        const int32_t rates[] = {outputRate, 3 * outputRate, 8000, 11025, 44100, 48000,
-                                 uniform(outputRate / 8, 3 * outputRate)};
-        r->setSourceSampleRate(std::min(rates[uniform(0, 6)], 3 * outputRate));
-        break;
-      }
-      case 1: {
-        const float left = std::uniform_real_distribution<float>(-3.0f, 3.0f)(random);
-        r->setVolume(left, uniform(0, 3) == 0 ? 1.0f : left * 0.75f);
-        break;
-      }
-      case 2:
-        r->reset();
-        break;
-      default:
-        break;
+    const int event = uniform(0, 9);
+    if (event == 0) {
+      const int32_t rates[] = {outputRate, 3 * outputRate, 8000, 11025, 44100, 48000,
+                               uniform(outputRate / 8, 3 * outputRate)};
+      r->setSourceSampleRate(std::min(rates[uniform(0, 6)], 3 * outputRate));
+    } else if (event == 1) {
+      const float left = std::uniform_real_distribution<float>(-3.0f, 3.0f)(random);
+      r->setVolume(left, uniform(0, 3) == 0 ? 1.0f : left * 0.75f);
+    } else if (event == 2) {
+      r->reset();
     }
     Samples in(static_cast<size_t>(uniform(0, 700)) * channels);
     for (int16_t& s : in) s = static_cast<int16_t>(uniform(-32768, 32767));
