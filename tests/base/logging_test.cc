@@ -34,9 +34,8 @@ TEST(Logging, OneLinePerStatementWithFileLineAndPlainFormatting) {
 std::string sunk;
 
 TEST(Logging, SinkTakesTheStderrLinesWithTheirPriority) {
-  platform_log::SetStderrSink([](int priority, const char* line) {
-    sunk += std::to_string(priority) + "|" + line;
-  });
+  platform_log::SetStderrSink(
+      [](int priority, const char* line) { sunk += std::to_string(priority) + "|" + line; });
   const int line = __LINE__ + 2;
   const std::string log = Captured([] {
     LOG(WARNING) << "w";

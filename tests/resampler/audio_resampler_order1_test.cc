@@ -131,22 +131,5 @@ TEST(Order1, LongRandomStreamsKeepTheirDigests) {
   }
 }
 
-// A stereo input of two equal channels gives on each side what the mono
-// input gives, though the two take different mixing paths.
-TEST(Order1, EqualChannelsActAsMono) {
-  std::mt19937 random(7);
-  Samples mono(20001);
-  for (int16_t& s : mono) s = static_cast<int16_t>(random());
-  Samples stereo(2 * mono.size());
-  for (size_t i = 0; i < mono.size(); ++i) stereo[2 * i] = stereo[2 * i + 1] = mono[i];
-  for (int32_t sourceRate : {44100, 48000, 144000}) {
-    auto from_stereo = Make(2, 48000, sourceRate, 0.75f, -1.5f);
-    const Samples expected =
-        Resample(from_stereo.get(), stereo, 2, from_stereo->getOutputSampleCount(mono.size()));
-    auto from_mono = Make(1, 48000, sourceRate, 0.75f, -1.5f, true);
-    EXPECT_EQ(Resample(from_mono.get(), mono, 1, expected.size()), expected) << sourceRate;
-  }
-}
-
 }  // namespace
 }  // namespace norvane
