@@ -73,8 +73,6 @@ def play_until(seconds):
 
 
 class Pages(unittest.TestCase):
-    """Pages of several inputs: complete, correct, playable."""
-
     def test_pages_load_draw_play_and_hold_the_reported_beats(self):
         # Fractions of the canvases' pixels drawn on: a flat line for silence.
         for name, make, seconds, largest, ink in (
