@@ -68,6 +68,14 @@ TEST(Order1, ProductsTruncateSaturateAndSumsWrap) {
   }
 }
 
+// A gain too large for the one-register path sends stereo input down the
+// sample-by-sample one, where the right channel must keep step too.
+TEST(Order1, LargeGainPathKeepsTheRightChannelInStep) {
+  auto r = Make(2, 48000, 48000, 1e5f, 1.0f);
+  EXPECT_EQ(Resample(r.get(), {0, 10, 0, 20, 0, 30, 0, 40}, 2, 8),
+            (Samples{0, 0, 0, 10, 0, 20, 0, 30}));
+}
+
 // FNV-1a over bytes.
 struct Digest {
   void Add(const void* data, size_t size) {
