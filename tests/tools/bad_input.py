@@ -13,6 +13,7 @@ class Refusals(unittest.TestCase):
     def setUpClass(cls):
         example('a.wav', seconds=3)
         example('b.wav', 100, seconds=3)
+        example('slow.wav', 120, 22050, 1, seconds=3)
         example('blip.wav', seconds=0.5)
         os.link(path('a.wav'), path('a-hard.wav'))
         os.symlink('a.wav', path('a-link.wav'))
@@ -55,6 +56,24 @@ class Refusals(unittest.TestCase):
         (('example', 'x.wav', '--channels', '3'), 2, "--channels '3' is not 1 or 2" + USAGE),
         (('example', 'x.wav', '--seconds', '0'), 2,
          "--seconds '0' is not a duration from 0 to 3600" + USAGE),
+        # Tempo ranges, refused before any analysis, naming the first file
+        # that cannot take one.
+        (('beats', '--tempo', 'nan-180', 'a.wav'), 2, 'tempo range NaN-180 BPM is not a range: '
+         'both ends must be numbers within 30-1200 BPM' + USAGE),
+        (('beats', '--tempo', '180-170', 'a.wav'), 2, 'tempo range 180-170 BPM is empty: '
+         'the minimum must be below the maximum' + USAGE),
+        (('beats', '--tempo', '20-80', 'a.wav'), 2,
+         'tempo range 20-80 BPM is outside 30-1200 BPM' + USAGE),
+        (('beats', '--tempo', 'fast', 'a.wav'), 2,
+         "--tempo 'fast' is not MIN-MAX in BPM, e.g. 150-200" + USAGE),
+        (('beats', '--tempo', '1000-1200', 'a.wav', 'slow.wav'), 2, 'a.wav: tempo range '
+         '1000-1200 BPM is too narrow: at 100 frames per second it holds 2 beat periods, '
+         '3 are needed'),
+        (('beats', '--tempo', '1000-1200', 'slow.wav', 'a.wav'), 2, 'slow.wav: tempo range '
+         '1000-1200 BPM is too narrow: at 99 frames per second it holds 2 beat periods, '
+         '3 are needed'),
+        (('beats', '--tempo', '800-1200', 'a.wav'), 2, 'a.wav: tempo range 800-1200 BPM '
+         'is too narrow: at 100 frames per second it holds 26 tracker states, 100 are needed'),
         # Outputs onto inputs, however they are named.
         (('resample', 'a.wav', 'a.wav', '--rate', 48000), 2,
          f"output 'a.wav' {SAME} input 'a.wav'; nothing written"),
