@@ -13,6 +13,7 @@ class Refusals(unittest.TestCase):
     def setUpClass(cls):
         example('a.wav', seconds=3)
         example('b.wav', 100, seconds=3)
+        example('slow.wav', 120, 22050, 1, seconds=3)
         example('blip.wav', seconds=0.5)
         os.link(path('a.wav'), path('a-hard.wav'))
         os.symlink('a.wav', path('a-link.wav'))
@@ -22,6 +23,7 @@ class Refusals(unittest.TestCase):
             with open(path(name), 'wb') as f:
                 f.write(text)
         silent_wav('no-frames.wav', 0)
+        silent_wav('silence.wav', 3)
 
     # (arguments, exit status, the line after 'clipweaver: ')
     USAGE = ' (see clipweaver --help)'
@@ -54,6 +56,24 @@ class Refusals(unittest.TestCase):
         (('example', 'x.wav', '--channels', '3'), 2, "--channels '3' is not 1 or 2" + USAGE),
         (('example', 'x.wav', '--seconds', '0'), 2,
          "--seconds '0' is not a duration from 0 to 3600" + USAGE),
+        # Tempo ranges, refused before any analysis, naming the first file
+        # that cannot take one.
+        (('beats', '--tempo', 'nan-180', 'a.wav'), 2, 'tempo range NaN-180 BPM is not a range: '
+         'both ends must be numbers within 30-1200 BPM' + USAGE),
+        (('beats', '--tempo', '180-170', 'a.wav'), 2, 'tempo range 180-170 BPM is empty: '
+         'the minimum must be below the maximum' + USAGE),
+        (('beats', '--tempo', '20-80', 'a.wav'), 2,
+         'tempo range 20-80 BPM is outside 30-1200 BPM' + USAGE),
+        (('beats', '--tempo', 'fast', 'a.wav'), 2,
+         "--tempo 'fast' is not MIN-MAX in BPM, e.g. 150-200" + USAGE),
+        (('beats', '--tempo', '1000-1200', 'a.wav', 'slow.wav'), 2, 'a.wav: tempo range '
+         '1000-1200 BPM is too narrow: at 100 frames per second it holds 2 beat periods, '
+         '3 are needed'),
+        (('beats', '--tempo', '1000-1200', 'slow.wav', 'a.wav'), 2, 'slow.wav: tempo range '
+         '1000-1200 BPM is too narrow: at 99 frames per second it holds 2 beat periods, '
+         '3 are needed'),
+        (('beats', '--tempo', '800-1200', 'a.wav'), 2, 'a.wav: tempo range 800-1200 BPM '
+         'is too narrow: at 100 frames per second it holds 26 tracker states, 100 are needed'),
         # Outputs onto inputs, however they are named.
         (('resample', 'a.wav', 'a.wav', '--rate', 48000), 2,
          f"output 'a.wav' {SAME} input 'a.wav'; nothing written"),
@@ -107,21 +127,22 @@ class Refusals(unittest.TestCase):
             os.chmod(path('b.wav'), 0o644)
         self.assertEqual(done.stderr, 'clipweaver: b.wav: unreadable: permission denied\n')
 
-    def test_good_files_among_bad_ones_still_get_their_beats(self):
+    def test_good_files_among_bad_ones_get_their_beats_in_argument_order(self):
         bad = [args[1] for args, status, _ in self.CASES
                if status == 1 and args[0] == 'beats']
-        done = run('beats', '-j3', '--format', 'json', *bad[:3], 'a.wav', *bad[3:])
+        files = bad[:3] + ['a.wav', 'b.wav', 'silence.wav'] + bad[3:]
+        done = run('beats', '-j3', '--format', 'json', *files)
         self.assertEqual(done.returncode, 1)
+        self.assertEqual(done.stdout, run('beats', '-j1', '--format', 'json', *files).stdout)
         results = [json.loads(line) for line in done.stdout.splitlines()]
-        self.assertEqual([r['file'] for r in results], bad[:3] + ['a.wav'] + bad[3:])
+        self.assertEqual([r['file'] for r in results], files)
+        self.assertEqual(set(results[3]), {'file', 'duration', 'sample_rate', 'channels',
+                                           'tempo', 'tracker_tempo', 'beats'})
         self.assertEqual((results[3]['tempo'], results[3]['tracker_tempo']), (120.0, 120.0))
+        # Silence is analysed but has no tempo.
+        self.assertEqual((results[5]['tempo'], results[5]['beats']), (None, []))
         self.assertEqual(results[0], {'file': 'missing.wav', 'error': 'no such file'})
         self.assertEqual(len(done.stderr.splitlines()), len(bad))
-
-    def test_silence_is_analysed_but_has_no_tempo(self):
-        done = run('beats', '--format', 'json', silent_wav('silence.wav', 3))
-        self.assertEqual(done.returncode, 0, done.stderr)
-        self.assertEqual([json.loads(done.stdout)[k] for k in ('tempo', 'beats')], [None, []])
 
 
 if __name__ == '__main__':

@@ -28,27 +28,23 @@ class HelpAndVersion(unittest.TestCase):
 
 
 def run_on_terminal(*args):
-    """Runs the tool with stderr on a pseudo-terminal; returns what the
-    terminal received and the exit status."""
+    """What the tool's stderr shows on a pseudo-terminal, and its exit status."""
     controller, terminal = pty.openpty()
     process = subprocess.Popen([tool_harness.TOOL, *args], stdout=subprocess.DEVNULL,
                                stderr=terminal, cwd=tool_harness.WORK)
     os.close(terminal)
     received = b''
-    while True:
-        try:
-            chunk = os.read(controller, 65536)
-        except OSError:  # the terminal closes with the process
-            break
-        if not chunk:
-            break
-        received += chunk
+    try:
+        while chunk := os.read(controller, 65536):
+            received += chunk
+    except OSError:  # the terminal closes with the process
+        pass
     os.close(controller)
     return received.decode(), process.wait()
 
 
 class ProgressBar(unittest.TestCase):
-    def test_drawn_on_a_terminal_up_to_100_percent_and_erased(self):
+    def test_drawn_on_a_terminal_up_to_100_percent_and_erased_unless_quiet_or_verbose(self):
         groove = example('groove.wav')
         shown, status = run_on_terminal('beats', groove)
         self.assertEqual(status, 0)
@@ -56,6 +52,10 @@ class ProgressBar(unittest.TestCase):
         self.assertEqual((percents[0], percents[-1], percents), (0, 100, sorted(percents)))
         self.assertIn('groove.wav', shown)
         self.assertTrue(shown.endswith('\x1b[J'))
+        self.assertEqual(run_on_terminal('beats', '--quiet', groove), ('', 0))
+        shown, _ = run_on_terminal('beats', '--verbose', groove)
+        self.assertNotIn('%', shown)
+        self.assertIn('native : ', shown)
 
     def test_one_row_per_worker(self):
         files = [example('groove.wav'), example('other.wav', 100)] * 2
@@ -64,13 +64,6 @@ class ProgressBar(unittest.TestCase):
         # Two rows are redrawn together: the cursor goes up two lines.
         self.assertIn('\x1b[2A', shown)
         self.assertNotIn('\x1b[3A', shown)
-
-    def test_quiet_and_verbose_draw_none(self):
-        groove = example('groove.wav')
-        self.assertEqual(run_on_terminal('beats', '--quiet', groove), ('', 0))
-        shown, _ = run_on_terminal('beats', '--verbose', groove)
-        self.assertNotIn('%', shown)
-        self.assertIn('native : ', shown)
 
 
 if __name__ == '__main__':

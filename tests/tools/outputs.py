@@ -5,7 +5,7 @@ import re
 import unittest
 import xml.etree.ElementTree as ElementTree
 
-from tool_harness import example, main, path, read_wav, run
+from tool_harness import beats_json, example, main, path, read_wav, run
 
 SVG = '{http://www.w3.org/2000/svg}'
 
@@ -14,17 +14,12 @@ class ClickTrackAndPlot(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
         cls.groove = example('groove.wav')
-        done = run('beats', '--format', 'json', cls.groove,
-                   '--click', 'clicks.wav', '--plot', 'groove.svg')
-        assert done.returncode == 0, done.stderr
-        cls.result = json.loads(done.stdout)
+        [cls.result] = beats_json(cls.groove, '--click', 'clicks.wav', '--plot', 'groove.svg')
 
     def test_plot_shows_every_beat_in_its_row_of_ten_seconds(self):
-        short = run('beats', '--format', 'json', example('fast.wav', 150, seconds=25),
-                    '--plot', 'fast.svg')
-        self.assertEqual(short.returncode, 0, short.stderr)
+        [fast] = beats_json(example('fast.wav', 150, seconds=25), '--plot', 'fast.svg')
         for svg, result, rows, bpm in (('groove.svg', self.result, 2, '120.0 BPM'),
-                                       ('fast.svg', json.loads(short.stdout), 3, '150.0 BPM')):
+                                       ('fast.svg', fast, 3, '150.0 BPM')):
             with self.subTest(svg):
                 root = ElementTree.parse(path(svg)).getroot()
                 self.assertIn(bpm, ''.join(root.find(SVG + 'text').itertext()))

@@ -17,16 +17,14 @@ class Resample(unittest.TestCase):
         cls.stereo = example('stereo.wav', 120, 44100, 2, seconds=3)
         cls.mono = example('mono.wav', 120, 48000, 1, seconds=3)
 
-    def test_frame_count_rate_and_channels(self):
+    def test_frame_counts_and_samples_across_blocks(self):
         # 3 s at the source rate make 3 s at the target rate.
         for source, rate, channels in [(self.stereo, 48000, 2), (self.stereo, 22050, 2),
-                                       (self.mono, 44100, 1), (self.mono, 16000, 1)]:
+                                       (self.mono, 44100, 1)]:
             with self.subTest(source=source, rate=rate):
                 got_channels, got_rate, samples = resample(source, 'out.wav', '--rate', rate)
                 self.assertEqual((got_channels, got_rate, len(samples)),
                                  (channels, rate, 3 * rate * channels))
-
-    def test_blocks_join_without_a_seam(self):
         # Equal rates pass every frame through, one frame late, with each
         # channel's gain truncated toward zero; a third of the rate keeps
         # every third frame.
@@ -38,8 +36,7 @@ class Resample(unittest.TestCase):
         self.assertEqual(out[3::2], [int(v * -0.25) for v in music[1:-2:2]])
         _, _, music = read_wav(self.mono)
         _, _, out = resample(self.mono, 'third.wav', '--rate', 16000)
-        self.assertEqual(out, [0] + music[2::3][:len(out) - 1])
-
+        self.assertEqual(out, [0] + music[2::3][:3 * 16000 - 1])
 
 if __name__ == '__main__':
     main()

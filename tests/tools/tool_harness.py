@@ -8,6 +8,7 @@ import json
 import os
 import resource
 import shutil
+import signal
 import subprocess
 import sys
 import unittest
@@ -34,21 +35,26 @@ def path(name):
 MEMORY_LIMIT = 1 << 30
 
 
-def limit_memory(limit=MEMORY_LIMIT):
-    return lambda: resource.setrlimit(resource.RLIMIT_AS, (limit, limit))
+def limits(memory=MEMORY_LIMIT, file_size=None):
+    def apply():
+        resource.setrlimit(resource.RLIMIT_AS, (memory, memory))
+        if file_size is not None:  # writes past it then fail instead of killing the tool
+            signal.signal(signal.SIGXFSZ, signal.SIG_IGN)
+            resource.setrlimit(resource.RLIMIT_FSIZE, (file_size, file_size))
+    return apply
 
 
-def run(*args, timeout=300, memory=MEMORY_LIMIT):
+def run(*args, timeout=300, memory=MEMORY_LIMIT, file_size=None):
     return subprocess.run([TOOL, *map(str, args)], capture_output=True,
                           text=True, timeout=timeout, cwd=WORK,
-                          preexec_fn=limit_memory(memory))
+                          preexec_fn=limits(memory, file_size))
 
 
-def start(*args, **options):
+def start(*args):
     """The tool running in the background, for tests that interrupt it."""
     return subprocess.Popen([TOOL, *map(str, args)], stdout=subprocess.PIPE,
                             stderr=subprocess.PIPE, text=True, cwd=WORK,
-                            preexec_fn=limit_memory(), **options)
+                            preexec_fn=limits())
 
 
 def example(name, bpm=120, rate=44100, channels=2, seconds=20):
