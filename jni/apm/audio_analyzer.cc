@@ -24,12 +24,10 @@ int16_t ReadSample(const uint8_t* bytes) {
   return static_cast<int16_t>(bytes[0] | (bytes[1] << 8));
 }
 
-}  // namespace
-
-void SubtractRunningMedian(int32_t window_length, std::vector<float>* values) {
+// The running median by a selection over each window, for input with NaN.
+void SubtractRunningMedianBySelection(int64_t half, std::vector<float>* values) {
   std::vector<float>& x = *values;
   const int64_t n = static_cast<int64_t>(x.size());
-  const int64_t half = window_length / 2;
   std::vector<float> window;
   window.reserve(static_cast<size_t>(std::min<int64_t>(n, 2 * half + 1)));
   for (int64_t i = 0; i < n; ++i) {
@@ -40,6 +38,66 @@ void SubtractRunningMedian(int32_t window_length, std::vector<float>* values) {
     std::nth_element(window.begin(), middle, window.end());
     const float d = x[i] - *middle;
     x[i] = d > 0 ? d : 0;
+  }
+}
+
+// The mean of each frame's channels, summed in channel order from 0.
+void MixDown(const uint8_t* interleaved, int32_t channels, int32_t count,
+             float* mono) {
+  if (channels == 2) {
+    // The common case in a loop the compiler vectorises; 0 + left is left.
+    for (int32_t i = 0; i < count; ++i) {
+      const float left = static_cast<float>(ReadSample(interleaved + 4 * i));
+      const float right = static_cast<float>(ReadSample(interleaved + 4 * i + 2));
+      mono[i] = (left + right) / 2.0f;
+    }
+    return;
+  }
+  for (int32_t i = 0; i < count; ++i, interleaved += 2 * channels) {
+    float sum = 0;
+    for (int32_t c = 0; c < channels; ++c) {
+      sum += static_cast<float>(ReadSample(interleaved + 2 * c));
+    }
+    mono[i] = sum / static_cast<float>(channels);
+  }
+}
+
+}  // namespace
+
+void SubtractRunningMedian(int32_t window_length, std::vector<float>* values) {
+  std::vector<float>& x = *values;
+  const int64_t n = static_cast<int64_t>(x.size());
+  const int64_t half = window_length / 2;
+  // NaN has no place in a sorted window; selection copes with it.
+  if (half < 0 || std::any_of(x.begin(), x.end(), [](float v) { return std::isnan(v); })) {
+    SubtractRunningMedianBySelection(half, &x);
+    return;
+  }
+  // The window kept sorted and moved a step at a time, instead of a
+  // selection over the whole window at every value.
+  int64_t lo = 0;
+  int64_t hi = std::min(half + 1, n);
+  std::vector<float> sorted(x.begin(), x.begin() + hi);
+  std::sort(sorted.begin(), sorted.end());
+  const auto erase = [&sorted](float v) {
+    sorted.erase(std::lower_bound(sorted.begin(), sorted.end(), v));
+  };
+  const auto insert = [&sorted](float v) {
+    sorted.insert(std::upper_bound(sorted.begin(), sorted.end(), v), v);
+  };
+  for (int64_t i = 0; i < n; ++i) {
+    const float original = x[i];
+    const float d = original - sorted[(hi - lo) / 2];
+    x[i] = d > 0 ? d : 0;
+    const int64_t next_lo = std::max<int64_t>(i + 1 - half, 0);
+    const int64_t next_hi = std::min<int64_t>(i + half + 2, n);
+    erase(original);
+    if (i >= next_lo) insert(x[i]);
+    // With no half window, x[i] itself was the value to leave.
+    if (next_lo > lo && lo != i) erase(x[lo]);
+    if (next_hi > hi) insert(x[hi]);
+    lo = next_lo;
+    hi = next_hi;
   }
 }
 
@@ -154,13 +212,8 @@ bool AudioAnalyzer::MixAndAnalyse(const uint8_t* interleaved,
   while (frame_count > 0) {
     const int32_t count = std::min(kBlockFrames, frame_count);
     if (samples_.size() < static_cast<size_t>(count)) samples_.resize(count);
-    for (int32_t i = 0; i < count; ++i, interleaved += frame_size) {
-      float sum = 0;
-      for (int32_t c = 0; c < channel_count_; ++c) {
-        sum += static_cast<float>(ReadSample(interleaved + 2 * c));
-      }
-      samples_[i] = sum / static_cast<float>(channel_count_);
-    }
+    MixDown(interleaved, channel_count_, count, samples_.data());
+    interleaved += count * frame_size;
     if (!spectrogram_calculator_.StreamBlock(samples_.data(), count,
                                              spectrogram_progress_, detect_)) {
       LOG(ERROR) << "Spectrogram process failed!";
