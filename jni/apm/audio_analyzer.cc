@@ -6,8 +6,10 @@
 #include <cmath>
 #include <cstdint>
 
+#include "base/instruction_set.h"
 #include "base/logging.h"
 #include "jni/apm/analysis_frame_rate.h"
+#include "jni/apm/frame_conversion_avx.h"
 #include "jni/apm/tempo_range.h"
 
 namespace apm {
@@ -198,9 +200,17 @@ void AudioAnalyzer::StartSpectrogram(int64_t frame_count) {
       std::max<int64_t>(frame_count, 0), INT32_MAX)));
   spectrogram_progress_ = StageProgress(0);
   detect_ = [this](const double* bins) {
-    for (size_t k = 0; k < frame_.size(); ++k) {
-      frame_[k] = {static_cast<float>(bins[2 * k]),
-                   static_cast<float>(bins[2 * k + 1])};
+#if defined(__x86_64__)
+    if (instruction_set::HasAvx()) {
+      DoublesToFloatsAvx(bins, 2 * static_cast<int32_t>(frame_.size()),
+                         reinterpret_cast<float*>(frame_.data()));
+    } else
+#endif
+    {
+      for (size_t k = 0; k < frame_.size(); ++k) {
+        frame_[k] = {static_cast<float>(bins[2 * k]),
+                     static_cast<float>(bins[2 * k + 1])};
+      }
     }
     detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
   };
