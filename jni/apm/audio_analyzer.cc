@@ -6,10 +6,9 @@
 #include <cmath>
 #include <cstdint>
 
-#include "base/instruction_set.h"
 #include "base/logging.h"
 #include "jni/apm/analysis_frame_rate.h"
-#include "jni/apm/frame_conversion_avx.h"
+#include "jni/apm/frame_transform.h"
 #include "jni/apm/tempo_range.h"
 
 namespace apm {
@@ -26,82 +25,23 @@ int16_t ReadSample(const uint8_t* bytes) {
   return static_cast<int16_t>(bytes[0] | (bytes[1] << 8));
 }
 
-// The running median by a selection over each window, for input with NaN.
-void SubtractRunningMedianBySelection(int64_t half, std::vector<float>* values) {
-  std::vector<float>& x = *values;
-  const int64_t n = static_cast<int64_t>(x.size());
-  std::vector<float> window;
-  window.reserve(static_cast<size_t>(std::min<int64_t>(n, 2 * half + 1)));
-  for (int64_t i = 0; i < n; ++i) {
-    const int64_t lo = std::max<int64_t>(i - half, 0);
-    const int64_t hi = std::min<int64_t>(i + half + 1, n);
-    window.assign(x.begin() + lo, x.begin() + hi);
-    auto middle = window.begin() + (hi - lo) / 2;
-    std::nth_element(window.begin(), middle, window.end());
-    const float d = x[i] - *middle;
-    x[i] = d > 0 ? d : 0;
+// 0 + left is left: the same sums as MixChannels, in a loop that vectorises.
+void MixStereo(const uint8_t* interleaved, int32_t count, float* mono) {
+  for (int32_t i = 0; i < count; ++i, interleaved += 4) {
+    mono[i] = (static_cast<float>(ReadSample(interleaved)) +
+               static_cast<float>(ReadSample(interleaved + 2))) / 2.0f;
   }
 }
 
-// The mean of each frame's channels, summed in channel order from 0.
-void MixDown(const uint8_t* interleaved, int32_t channels, int32_t count,
-             float* mono) {
-  if (channels == 2) {
-    // The common case in a loop the compiler vectorises; 0 + left is left.
-    for (int32_t i = 0; i < count; ++i) {
-      const float left = static_cast<float>(ReadSample(interleaved + 4 * i));
-      const float right = static_cast<float>(ReadSample(interleaved + 4 * i + 2));
-      mono[i] = (left + right) / 2.0f;
-    }
-    return;
-  }
-  for (int32_t i = 0; i < count; ++i, interleaved += 2 * channels) {
+void MixChannels(const uint8_t* pcm, int32_t channels, int32_t n, float* mono) {
+  for (int32_t i = 0; i < n; ++i, pcm += 2 * channels) {
     float sum = 0;
-    for (int32_t c = 0; c < channels; ++c) {
-      sum += static_cast<float>(ReadSample(interleaved + 2 * c));
-    }
+    for (int32_t c = 0; c < channels; ++c) sum += ReadSample(pcm + 2 * c);
     mono[i] = sum / static_cast<float>(channels);
   }
 }
 
 }  // namespace
-
-void SubtractRunningMedian(int32_t window_length, std::vector<float>* values) {
-  std::vector<float>& x = *values;
-  const int64_t n = static_cast<int64_t>(x.size());
-  const int64_t half = window_length / 2;
-  // NaN has no place in a sorted window; selection copes with it.
-  if (half < 0 || std::any_of(x.begin(), x.end(), [](float v) { return std::isnan(v); })) {
-    SubtractRunningMedianBySelection(half, &x);
-    return;
-  }
-  // The window kept sorted and moved a step at a time, instead of a
-  // selection over the whole window at every value.
-  int64_t lo = 0;
-  int64_t hi = std::min(half + 1, n);
-  std::vector<float> sorted(x.begin(), x.begin() + hi);
-  std::sort(sorted.begin(), sorted.end());
-  const auto erase = [&sorted](float v) {
-    sorted.erase(std::lower_bound(sorted.begin(), sorted.end(), v));
-  };
-  const auto insert = [&sorted](float v) {
-    sorted.insert(std::upper_bound(sorted.begin(), sorted.end(), v), v);
-  };
-  for (int64_t i = 0; i < n; ++i) {
-    const float original = x[i];
-    const float d = original - sorted[(hi - lo) / 2];
-    x[i] = d > 0 ? d : 0;
-    const int64_t next_lo = std::max<int64_t>(i + 1 - half, 0);
-    const int64_t next_hi = std::min<int64_t>(i + half + 2, n);
-    erase(original);
-    if (i >= next_lo) insert(x[i]);
-    // With no half window, x[i] itself was the value to leave.
-    if (next_lo > lo && lo != i) erase(x[lo]);
-    if (next_hi > hi) insert(x[hi]);
-    lo = next_lo;
-    hi = next_hi;
-  }
-}
 
 bool NormalizeDetectionFunction(std::vector<float>* values) {
   if (values->empty()) return false;
@@ -200,18 +140,10 @@ void AudioAnalyzer::StartSpectrogram(int64_t frame_count) {
       std::max<int64_t>(frame_count, 0), INT32_MAX)));
   spectrogram_progress_ = StageProgress(0);
   detect_ = [this](const double* bins) {
-#if defined(__x86_64__)
-    if (instruction_set::HasAvx()) {
-      DoublesToFloatsAvx(bins, 2 * static_cast<int32_t>(frame_.size()),
-                         reinterpret_cast<float*>(frame_.data()));
-    } else
-#endif
-    {
-      for (size_t k = 0; k < frame_.size(); ++k) {
-        frame_[k] = {static_cast<float>(bins[2 * k]),
-                     static_cast<float>(bins[2 * k + 1])};
-      }
-    }
+    // The spectrogram hands out the FFT's doubles; the detector takes the
+    // floats a stored frame would hold.
+    BinsToFloats(bins, static_cast<int32_t>(frame_.size()),
+                 reinterpret_cast<float*>(frame_.data()));
     detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
   };
 }
@@ -222,7 +154,12 @@ bool AudioAnalyzer::MixAndAnalyse(const uint8_t* interleaved,
   while (frame_count > 0) {
     const int32_t count = std::min(kBlockFrames, frame_count);
     if (samples_.size() < static_cast<size_t>(count)) samples_.resize(count);
-    MixDown(interleaved, channel_count_, count, samples_.data());
+    // Stereo, the common case, has a loop of its own.
+    if (channel_count_ == 2) {
+      MixStereo(interleaved, count, samples_.data());
+    } else {
+      MixChannels(interleaved, channel_count_, count, samples_.data());
+    }
     interleaved += count * frame_size;
     if (!spectrogram_calculator_.StreamBlock(samples_.data(), count,
                                              spectrogram_progress_, detect_)) {

@@ -18,13 +18,11 @@ constexpr float kStartPhasorIm = 8.742278e-8f;
 // Sums four lanes side by side, then the lanes pairwise, then the bins that
 // do not fill a lane group, so the result is the same on every vector width.
 float LaneSum(const float* values, int32_t count) {
-  simd::Float4 lanes = simd::Splat<simd::Float4>(0.0f);
+  float lane[4] = {0, 0, 0, 0};
   int32_t k = 0;
   for (; k + 4 <= count; k += 4) {
-    lanes = lanes + simd::Load<simd::Float4>(values + k);
+    for (int j = 0; j < 4; ++j) lane[j] += values[k + j];
   }
-  float lane[4];
-  simd::Store(lane, lanes);
   float sum = (lane[0] + lane[1]) + (lane[2] + lane[3]);
   for (; k < count; ++k) sum += values[k];
   return sum;
