@@ -57,16 +57,20 @@ inline int ReverseBits(int x, int bits) {
 // different number (once per pair), and self(i) for the others. An index is
 // split into a high and a low digit of bits/2 bits and a middle bit when bits
 // is odd; reversal swaps the high digit with the reversed low one, so the
-// pairs come from digit pairs and need no test.
+// pairs come from digit pairs and need no test. Inlined by force: GCC
+// would otherwise call it, and the pair and self passed to it too.
 template <typename Pair, typename Self>
-inline void ForEachReversal(int bits, Pair pair, Self self) {
+__attribute__((always_inline)) inline void ForEachReversal(int bits, Pair pair, Self self) {
   const int r = bits >> 1;
   const int middles = 1 << (bits & 1);
   const int high_unit = middles << r;
+  // Looked up in the inner loop rather than worked out there again.
+  int reversed[1 << 8];
+  for (int x = 0; x < (1 << r); ++x) reversed[x] = ReverseBits(x, r);
   for (int x = 0; x < (1 << r); ++x) {
-    const int reversed_x = ReverseBits(x, r);
+    const int reversed_x = reversed[x];
     for (int y = 0; y < x; ++y) {
-      const int reversed_y = ReverseBits(y, r);
+      const int reversed_y = reversed[y];
       for (int m = 0; m < middles; ++m) {
         pair(x * high_unit + (m << r) + reversed_y, y * high_unit + (m << r) + reversed_x);
       }

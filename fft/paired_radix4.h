@@ -33,8 +33,10 @@ SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
   return {low, high};
 }
 
+// Flattened: left as calls, the columns take their turns through memory.
 template <typename V, typename W>
-void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t) {
+__attribute__((flatten)) void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h,
+                                               const double* t) {
   const std::ptrdiff_t s = length / 2, step = 2 * length;
   const double* const end = a + 2 * h;
   const auto column = [&](double* p, auto turn2, auto turn1, auto turn3) {

@@ -6,6 +6,9 @@
 #include <cstring>
 #include <limits>
 
+#include "base/instruction_set.h"
+#include "jni/apm/score_state_avx.h"
+
 // Why ScoreOnBeat gives the naive pass's results bit for bit. For a lag j,
 // the score of entry k is fl(base[k] + x), and x only depends on the period
 // term and the phase term. Past a certain difference each table holds one
@@ -145,6 +148,13 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
   // Looked up by signed difference: the loop neither folds nor clips.
   const double* period = period_by_difference_.data() + lag_count_ - 1 - lag;
   const double* phase = phase_by_difference_.data() + offset_range_ - offset;
+#if defined(__x86_64__)
+  if (instruction_set::HasAvx()) {
+    ScoreStateAvx(entries.base, entries.lag, entries.offset, entries.count,
+                  period, phase, observation, prior, best, from);
+    return;
+  }
+#endif
   double top = *best;
   int32_t top_from = *from;
   for (int32_t k = 0; k < entries.count; ++k) {

@@ -8,6 +8,7 @@
 
 #include "base/logging.h"
 #include "jni/apm/analysis_frame_rate.h"
+#include "jni/apm/frame_transform.h"
 #include "jni/apm/tempo_range.h"
 
 namespace apm {
@@ -24,24 +25,23 @@ int16_t ReadSample(const uint8_t* bytes) {
   return static_cast<int16_t>(bytes[0] | (bytes[1] << 8));
 }
 
-}  // namespace
-
-void SubtractRunningMedian(int32_t window_length, std::vector<float>* values) {
-  std::vector<float>& x = *values;
-  const int64_t n = static_cast<int64_t>(x.size());
-  const int64_t half = window_length / 2;
-  std::vector<float> window;
-  window.reserve(static_cast<size_t>(std::min<int64_t>(n, 2 * half + 1)));
-  for (int64_t i = 0; i < n; ++i) {
-    const int64_t lo = std::max<int64_t>(i - half, 0);
-    const int64_t hi = std::min<int64_t>(i + half + 1, n);
-    window.assign(x.begin() + lo, x.begin() + hi);
-    auto middle = window.begin() + (hi - lo) / 2;
-    std::nth_element(window.begin(), middle, window.end());
-    const float d = x[i] - *middle;
-    x[i] = d > 0 ? d : 0;
+// 0 + left is left: the same sums as MixChannels, in a loop that vectorises.
+void MixStereo(const uint8_t* interleaved, int32_t count, float* mono) {
+  for (int32_t i = 0; i < count; ++i, interleaved += 4) {
+    mono[i] = (static_cast<float>(ReadSample(interleaved)) +
+               static_cast<float>(ReadSample(interleaved + 2))) / 2.0f;
   }
 }
+
+void MixChannels(const uint8_t* pcm, int32_t channels, int32_t n, float* mono) {
+  for (int32_t i = 0; i < n; ++i, pcm += 2 * channels) {
+    float sum = 0;
+    for (int32_t c = 0; c < channels; ++c) sum += ReadSample(pcm + 2 * c);
+    mono[i] = sum / static_cast<float>(channels);
+  }
+}
+
+}  // namespace
 
 bool NormalizeDetectionFunction(std::vector<float>* values) {
   if (values->empty()) return false;
@@ -140,10 +140,10 @@ void AudioAnalyzer::StartSpectrogram(int64_t frame_count) {
       std::max<int64_t>(frame_count, 0), INT32_MAX)));
   spectrogram_progress_ = StageProgress(0);
   detect_ = [this](const double* bins) {
-    for (size_t k = 0; k < frame_.size(); ++k) {
-      frame_[k] = {static_cast<float>(bins[2 * k]),
-                   static_cast<float>(bins[2 * k + 1])};
-    }
+    // The spectrogram hands out the FFT's doubles; the detector takes the
+    // floats a stored frame would hold.
+    BinsToFloats(bins, static_cast<int32_t>(frame_.size()),
+                 reinterpret_cast<float*>(frame_.data()));
     detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
   };
 }
@@ -154,13 +154,13 @@ bool AudioAnalyzer::MixAndAnalyse(const uint8_t* interleaved,
   while (frame_count > 0) {
     const int32_t count = std::min(kBlockFrames, frame_count);
     if (samples_.size() < static_cast<size_t>(count)) samples_.resize(count);
-    for (int32_t i = 0; i < count; ++i, interleaved += frame_size) {
-      float sum = 0;
-      for (int32_t c = 0; c < channel_count_; ++c) {
-        sum += static_cast<float>(ReadSample(interleaved + 2 * c));
-      }
-      samples_[i] = sum / static_cast<float>(channel_count_);
+    // Stereo, the common case, has a loop of its own.
+    if (channel_count_ == 2) {
+      MixStereo(interleaved, count, samples_.data());
+    } else {
+      MixChannels(interleaved, channel_count_, count, samples_.data());
     }
+    interleaved += count * frame_size;
     if (!spectrogram_calculator_.StreamBlock(samples_.data(), count,
                                              spectrogram_progress_, detect_)) {
       LOG(ERROR) << "Spectrogram process failed!";

@@ -17,15 +17,10 @@
 
 #include "jni/apm/apm.h"
 #include "jni/apm/onset_detector.h"
+#include "jni/apm/running_median.h"
 #include "jni/apm/spectrogram_calculator.h"
 
 namespace apm {
-
-// Removes the slowly varying level: each value minus the upper median of
-// the window_length values around it (fewer at the ends), kept when
-// positive. Runs in place from left to right, so each window already sees
-// the rewritten values to the left of its centre.
-void SubtractRunningMedian(int32_t window_length, std::vector<float>* values);
 
 // Divides by the largest value and takes the square root, so the result
 // lies in 0..1 with maximum 1. Returns false, leaving the values as they

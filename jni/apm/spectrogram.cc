@@ -4,7 +4,7 @@
 #include <cmath>
 
 #include "base/logging.h"
-#include "fft/real_fft.h"
+#include "jni/apm/frame_transform.h"
 
 namespace apm {
 
@@ -138,16 +138,9 @@ bool Spectrogram::TakeNextWindow(const float* input, int32_t input_size,
 }
 
 void Spectrogram::TransformWindow() {
-  const float* samples = window_samples_;
-  for (int32_t j = 0; j < window_length_; ++j) {
-    fft_buffer_[j] = window_[j] * static_cast<double>(samples[j]);
-  }
-  for (int32_t j = window_length_; j < fft_length_; ++j) fft_buffer_[j] = 0.0;
-  RealFft(fft_length_, 1, fft_buffer_.data(), bit_reversal_work_.data(),
-          twiddle_table_.data());
-  fft_buffer_[fft_length_] = fft_buffer_[1];
-  fft_buffer_[fft_length_ + 1] = 0.0;
-  fft_buffer_[1] = 0.0;
+  TransformFrame(window_samples_, window_.data(), window_length_, fft_length_,
+                 fft_buffer_.data(), bit_reversal_work_.data(),
+                 twiddle_table_.data());
 }
 
 }  // namespace apm

@@ -28,6 +28,30 @@ TEST(Conditioning, RunningMedianSeesRewrittenValuesOnItsLeft) {
   EXPECT_EQ(Conditioned(201, spike), spike);
 }
 
+// Against a selection over each window, on values with many ties, windows
+// longer than the input and even lengths.
+TEST(Conditioning, RunningMedianMatchesSelectionPerWindow) {
+  uint32_t random = 5;
+  for (const int32_t window : {1, 2, 3, 4, 7, 30, 201}) {
+    for (const int n : {0, 1, 6, 90, 500}) {
+      std::vector<float> x(n);
+      for (float& v : x) {
+        random = random * 1664525u + 1013904223u;
+        v = static_cast<float>((random >> 16) % 7) - 2.0f;
+      }
+      std::vector<float> expected = x;
+      const int half = window / 2;
+      for (int i = 0; i < n; ++i) {
+        std::vector<float> w(expected.begin() + std::max(i - half, 0),
+                             expected.begin() + std::min(i + half + 1, n));
+        std::nth_element(w.begin(), w.begin() + w.size() / 2, w.end());
+        expected[i] = std::max(expected[i] - w[w.size() / 2], 0.0f);
+      }
+      EXPECT_EQ(Conditioned(window, x), expected) << window << " " << n;
+    }
+  }
+}
+
 TEST(Conditioning, NormalisationScalesToOneAndRefusesFlatInput) {
   std::vector<float> x = {0, 0, 10, 0};
   EXPECT_TRUE(NormalizeDetectionFunction(&x));
