@@ -11,31 +11,37 @@ import java.lang.ref.WeakReference;
 import java.lang.reflect.Field;
 import java.nio.ByteBuffer;
 import java.nio.ByteOrder;
-import java.util.ArrayList;
 import java.util.Arrays;
 import java.util.List;
+import java.util.Random;
 import org.junit.jupiter.api.Test;
 import org.junit.jupiter.api.function.Executable;
 import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
 
 public class AudioResamplerTest {
-  private static final byte FILL = 0x55;
-  private static final short FILL_SAMPLE = 0x5555;
-
-  private static ByteBuffer context() {
-    return ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
-  }
-
+  // Every byte starts as 0x5a, so that the reserved ones show whether they were written.
   private static ByteBuffer created(int channels, int rate, boolean stereoOutput) {
-    ByteBuffer context = context();
+    ByteBuffer context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
+    for (int i = 0; i < 16; i++) context.put(i, (byte) 0x5a);
     AudioResampler.createNativeResampler(context, 2, channels, rate, stereoOutput);
     return context;
   }
 
-  private static byte[] pcm(int... samples) {
+  // Samples as text; "-" stands for 0x5555, the filling of output the call must not touch.
+  private static short[] parse(String text) {
+    String[] words = text == null ? new String[0] : text.split(" ");
+    short[] samples = new short[words.length];
+    for (int i = 0; i < words.length; i++) {
+      samples[i] = words[i].equals("-") ? 0x5555 : Short.parseShort(words[i]);
+    }
+    return samples;
+  }
+
+  private static byte[] pcm(String text) {
+    short[] samples = parse(text);
     ByteBuffer bytes = ByteBuffer.allocate(2 * samples.length).order(ByteOrder.nativeOrder());
-    for (int s : samples) bytes.putShort((short) s);
+    bytes.asShortBuffer().put(samples);
     return bytes.array();
   }
 
@@ -46,86 +52,74 @@ public class AudioResamplerTest {
   }
 
   private static ByteBuffer direct(byte[] bytes) {
-    ByteBuffer buffer = ByteBuffer.allocateDirect(bytes.length);
-    buffer.put(bytes).clear();
-    return buffer;
+    return ByteBuffer.allocateDirect(bytes.length).put(bytes).clear();
   }
 
   private static byte[] filled(int size) {
     byte[] bytes = new byte[size];
-    Arrays.fill(bytes, FILL);
+    Arrays.fill(bytes, (byte) 0x55);
     return bytes;
+  }
+
+  private static void resample(ByteBuffer context, boolean fromBuffer, byte[] input, int offset,
+      int length, byte[] output, int frames, boolean accumulate) {
+    if (fromBuffer) {
+      AudioResampler.resampleFromByteBuffer(
+          context, direct(input), offset, length, output, frames, accumulate);
+    } else {
+      AudioResampler.resampleFromByteArray(
+          context, input, offset, length, output, frames, accumulate);
+    }
   }
 
   @Test
   void contextHoldsInstanceChannelCountAndStereoFlag() {
     assertEquals(16, AudioResampler.getNativeResamplerContextSize());
     for (int channels = 1; channels <= 2; channels++) {
-      ByteBuffer context = context();
-      for (int i = 12; i < 16; i++) context.put(i, (byte) 0x5a);
-      AudioResampler.createNativeResampler(context, 2, channels, 48000, channels == 1);
-      assertNotEquals(0L, context.getLong(0));
+      ByteBuffer context = created(channels, 48000, channels == 1);
+      assertNotEquals(0x5a5a5a5a5a5a5a5aL, context.getLong(0));
       assertEquals(channels, context.getInt(8));
       assertEquals(channels == 1 ? 1 : 0, context.get(12));
       for (int i = 13; i < 16; i++) assertEquals(0x5a, context.get(i), "reserved byte " + i);
       AudioResampler.releaseNativeResampler(context);
+      assertEquals(0L, context.getLong(0));
     }
   }
 
-  // Without input the frames asked are cleared; 441 input frames at 44100 Hz
-  // then write 480 output frames at 48000 Hz.
-  @ParameterizedTest(name = "{0} channels, stereo output {1}")
-  @CsvSource({"2, false, 400, 960", "2, true, 400, 960", "1, true, 400, 960", "1, false, 200, 480"})
-  void clearsTheFramesAskedAndWritesTheOutputCountOfTheInput(
-      int channels, boolean stereo, int cleared, int written) {
-    ByteBuffer context = created(channels, 48000, stereo);
-    byte[] output = filled(4000);
-    AudioResampler.resampleFromByteArray(context, new byte[0], 0, 0, output, 100, false);
-    byte[] expected = filled(4000);
-    Arrays.fill(expected, 0, cleared, (byte) 0);
-    assertArrayEquals(expected, output);
-
-    AudioResampler.setSourceSampleRate(context, 44100);
-    int[] input = new int[441 * channels];
-    Arrays.fill(input, 1000);
-    output = filled(4000);
-    AudioResampler.resampleFromByteArray(context, pcm(input), 0, input.length, output, 0, false);
-    short[] out = samples(output);
-    for (int i = written / 480; i < out.length; i++) {
-      assertEquals(i >= written, out[i] == FILL_SAMPLE, "sample " + i);
+  // Output at 48000 Hz, the frames asked cleared unless accumulating, then
+  // the input mixed in: linear interpolation between neighbouring input
+  // frames, the first from the silent frame before the input. At 44100 Hz the
+  // weights are 0, 30105, 27443, 24780 and 22118 (of 32768).
+  @ParameterizedTest(name = "{0}")
+  @CsvSource({
+    "44100 Hz, 1, false, 44100, 1, 1, 1000 -2000 3000 -4000 0, , 5, false, 0 918 -1513 1781 -1725",
+    "mono, 1, false, 24000, 1, 1, 1000 2000 3000, , 8, false, 0 500 1000 1500 2000 2500 0 0 - -",
+    "mono to stereo, 1, true, 24000, 0.5, 2, 1000 2000 3000, , 7, false,"
+        + " 0 0 250 1000 500 2000 750 3000 1000 4000 1250 5000 0 0 - -",
+    "stereo, 2, false, 24000, 1, -0.5, 1000 -1000 2000 -2000 3000 -3000, , 7, false,"
+        + " 0 0 500 250 1000 500 1500 750 2000 1000 2500 1250 0 0 - -",
+    "no input, 2, true, 24000, 1, 1, , , 3, false, 0 0 0 0 0 0 - -",
+    // Accumulating ignores the frames to clear; -30000 + -15000 wraps to 20536.
+    "accumulating, 1, true, 48000, 1, -0.5, 4 30000 0, 10 20 30 40 30000 -30000 5 5, 9, true,"
+        + " 10 20 34 38 -5536 20536 5 5",
+  })
+  void clearsAndResamplesIntoTheOutput(String name, int channels, boolean stereo, int rate,
+      float left, float right, String input, String before, int frames, boolean accumulate,
+      String expected) {
+    byte[] block = pcm(input);
+    for (int offset : new int[] {0, 3}) {
+      for (boolean fromBuffer : new boolean[] {false, true}) {
+        ByteBuffer context = created(channels, 48000, stereo);
+        AudioResampler.setSourceSampleRate(context, rate);
+        AudioResampler.setVolume(context, left, right);
+        byte[] in = new byte[offset + block.length];
+        System.arraycopy(block, 0, in, offset, block.length);
+        byte[] output = pcm(before == null ? expected.replaceAll("[0-9-]+", "-") : before);
+        resample(context, fromBuffer, in, offset, block.length / 2, output, frames, accumulate);
+        assertArrayEquals(parse(expected), samples(output), "offset " + offset + " " + fromBuffer);
+        AudioResampler.releaseNativeResampler(context);
+      }
     }
-    AudioResampler.releaseNativeResampler(context);
-  }
-
-  // Weights 0, 30105, 27443, 24780 and 22118 (of 32768) between neighbouring
-  // input frames, the first two from the silent frame before the input.
-  @ParameterizedTest(name = "{0} at byte offset {1}")
-  @CsvSource({"array, 0", "array, 1", "buffer, 0", "buffer, 3"})
-  void interpolatesFrom44100To48000(String source, int offset) {
-    ByteBuffer context = created(1, 48000, false);
-    AudioResampler.setSourceSampleRate(context, 44100);
-    byte[] block = pcm(1000, -2000, 3000, -4000, 0);
-    byte[] input = new byte[offset + block.length];
-    System.arraycopy(block, 0, input, offset, block.length);
-    byte[] output = new byte[10];
-    if (source.equals("array")) {
-      AudioResampler.resampleFromByteArray(context, input, offset, 5, output, 5, false);
-    } else {
-      AudioResampler.resampleFromByteBuffer(context, direct(input), offset, 5, output, 5, false);
-    }
-    assertArrayEquals(new short[] {0, 918, -1513, 1781, -1725}, samples(output));
-    AudioResampler.releaseNativeResampler(context);
-  }
-
-  @Test
-  void accumulatingMixesIntoTheOutputAndWrapsAround() {
-    ByteBuffer context = created(1, 44100, true);
-    AudioResampler.setVolume(context, 1.0f, -0.5f);
-    byte[] output = pcm(10, 20, 30, 40, 30000, -30000);
-    AudioResampler.resampleFromByteArray(context, pcm(4, 30000, 0), 0, 3, output, 0, true);
-    // -30000 + -15000 wraps to 20536.
-    assertArrayEquals(new short[] {10, 20, 34, 38, -5536, 20536}, samples(output));
-    AudioResampler.releaseNativeResampler(context);
   }
 
   // Each case is a call that would read or write out of bounds, or whose
@@ -156,15 +150,8 @@ public class AudioResamplerTest {
       ByteBuffer context = created(channels, 48000, false);
       if (at == 8) context.putInt(at, value);
       if (at == 12) context.put(at, (byte) value);
-      byte[] input = pcm(new int[882]);
       byte[] output = filled(outputBytes);
-      if (fromBuffer) {
-        AudioResampler.resampleFromByteBuffer(
-            context, direct(input), offset, length, output, frames, accumulate);
-      } else {
-        AudioResampler.resampleFromByteArray(
-            context, input, offset, length, output, frames, accumulate);
-      }
+      resample(context, fromBuffer, new byte[1764], offset, length, output, frames, accumulate);
       assertArrayEquals(filled(outputBytes), output, name + (fromBuffer ? " (buffer)" : ""));
       context.putInt(8, channels).put(12, (byte) 0);
       AudioResampler.releaseNativeResampler(context);
@@ -176,14 +163,13 @@ public class AudioResamplerTest {
   void unusableContextsAndInputsAreIgnored() {
     ByteBuffer released = created(2, 48000, false);
     AudioResampler.releaseNativeResampler(released);
-    assertEquals(0L, released.getLong(0));
     for (ByteBuffer context :
         new ByteBuffer[] {ByteBuffer.allocateDirect(8), ByteBuffer.allocate(16), null, released}) {
       if (context != released) AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
       AudioResampler.setVolume(context, 1, 1);
       AudioResampler.setSourceSampleRate(context, 44100);
       byte[] output = filled(20);
-      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
+      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
       assertArrayEquals(filled(20), output);
       AudioResampler.releaseNativeResampler(context);
       if (context != null && context.capacity() >= 8) assertEquals(0L, context.getLong(0));
@@ -192,24 +178,9 @@ public class AudioResamplerTest {
     ByteBuffer context = created(2, 48000, false);
     byte[] output = filled(100);
     AudioResampler.resampleFromByteBuffer(
-        context, ByteBuffer.wrap(pcm(1, 2, 3, 4)), 0, 4, output, 20, false);
+        context, ByteBuffer.wrap(new byte[8]), 0, 4, output, 20, false);
     assertArrayEquals(filled(100), output);
     AudioResampler.releaseNativeResampler(context);
-  }
-
-  @Test
-  void tamperedContextIsRefusedUntilRestored() {
-    ByteBuffer context = created(2, 44100, false);
-    context.putInt(8, 1);
-    AudioResampler.setVolume(context, 0, 0);
-    AudioResampler.releaseNativeResampler(context);
-    assertNotEquals(0L, context.getLong(0));
-    context.putInt(8, 2);
-    byte[] output = new byte[8];
-    AudioResampler.resampleFromByteArray(context, pcm(7, 7, 7, 7), 0, 4, output, 2, false);
-    assertArrayEquals(new short[] {0, 0, 7, 7}, samples(output), "the gain was changed");
-    AudioResampler.releaseNativeResampler(context);
-    assertEquals(0L, context.getLong(0));
   }
 
   @Test
@@ -228,36 +199,29 @@ public class AudioResamplerTest {
     assertEquals(0L, context.getLong(0), "the instance was not released");
   }
 
+  // Mono in, stereo out: 480 samples at 48000 Hz make 160 frames of 4 bytes at 16000 Hz.
   @Test
-  void wrapperResamplesLikeTheRawBridge() {
-    byte[] input = new byte[4 * 441];
-    new java.util.Random(7).nextBytes(input);
-    ByteBuffer context = created(2, 48000, false);
-    AudioResampler.setSourceSampleRate(context, 44100);
+  void wrapperResamplesLikeTheRawEntriesAfterCheckingItsArguments() {
+    byte[] input = new byte[960];
+    new Random(7).nextBytes(input);
+    ByteBuffer context = created(1, 16000, true);
+    AudioResampler.setSourceSampleRate(context, 48000);
     AudioResampler.setVolume(context, 0.5f, 2.0f);
-    byte[] expected = new byte[4 * 480];
-    byte[] output = new byte[4 * 480];
-    try (AudioResampler resampler = new AudioResampler(2, 48000, false)) {
-      resampler.setSourceSampleRate(44100);
-      resampler.setVolume(0.5f, 2.0f);
-      assertEquals(480, resampler.getOutputFrameCount(441));
-      for (int block = 0; block < 2; block++) {
-        AudioResampler.resampleFromByteArray(context, input, 0, 882, expected, 480, false);
-        if (block == 0) resampler.resample(input, 0, 882, output, 480, false);
-        else resampler.resample(direct(input), 0, 882, output, 480, false);
-        assertArrayEquals(expected, output, "block " + block);
-      }
-    }
-    AudioResampler.releaseNativeResampler(context);
-  }
-
-  @Test
-  void wrapperRejectsBadArgumentsBeforeTheNativeCall() {
     AudioResampler resampler = new AudioResampler(1, 16000, true);
     assertEquals(2, resampler.getOutputChannelCount());
     resampler.setSourceSampleRate(48000);
+    resampler.setVolume(0.5f, 2.0f);
     assertEquals(48000, resampler.getSourceSampleRate());
-    byte[] input = new byte[960];
+    assertEquals(160, resampler.getOutputFrameCount(480));
+    for (boolean fromBuffer : new boolean[] {false, true}) {
+      byte[] expected = new byte[640];
+      byte[] output = new byte[640];
+      AudioResampler.resampleFromByteArray(context, input, 0, 480, expected, 160, false);
+      if (fromBuffer) resampler.resample(direct(input), 0, 480, output, 160, false);
+      else resampler.resample(input, 0, 480, output, 160, false);
+      assertArrayEquals(expected, output, "from buffer " + fromBuffer);
+    }
+    AudioResampler.releaseNativeResampler(context);
     for (Executable call : new Executable[] {
         () -> new AudioResampler(3, 48000, false),
         () -> new AudioResampler(1, 0, false),
@@ -272,7 +236,6 @@ public class AudioResamplerTest {
         () -> resampler.resample(input, 0, 0, new byte[640], 161, false)}) {
       assertThrows(IndexOutOfBoundsException.class, call);
     }
-    resampler.resample(input, 0, 480, new byte[640], 160, false);
     resampler.close();
     resampler.close();
     assertThrows(IllegalStateException.class, () -> resampler.setVolume(1, 1));
@@ -280,13 +243,13 @@ public class AudioResamplerTest {
         () -> resampler.resample(input, 0, 480, new byte[640], 160, false));
   }
 
+  // A tampered context is refused, and its instance kept, until it is restored.
   @Test
   void logsEachProblemOnce() throws Exception {
     ChildJvm child = ChildJvm.run(LogScenario.class);
-    assertEquals(0, child.exitCode, child.stderr);
-    List<String> lines = new ArrayList<>();
-    // Without line numbers.
-    child.stderr.lines().forEach(line -> lines.add(line.replaceFirst("\\.cc:[0-9]+ ", ".cc: ")));
+    assertEquals("[0, 0, 7, 7]\n0\n", child.stdout());
+    String tampered = "native : resampler_bridge.cc: Bad resampler context: it holds 1 channels"
+        + " and stereo flag 0, its instance was made with 2 and 0: call ignored.";
     assertEquals(
         List.of(
             "AudioResampler : Unsupported sample format, 8 bits, 1 channels",
@@ -295,28 +258,37 @@ public class AudioResamplerTest {
                 + " 2000 bytes to clear and 0 bytes to resample: nothing resampled.",
             "native : resampler_bridge.cc: Resampler input of 8 samples at byte 0 exceeds"
                 + " the 4 bytes given: nothing resampled.",
-            "native : resampler_bridge.cc: Bad resampler context: it holds 2 channels and"
-                + " stereo flag 0, its instance was made with 1 and 0: call ignored."),
-        lines);
+            tampered,
+            tampered),
+        // Without line numbers.
+        child.stderr().lines().map(line -> line.replaceFirst("\\.cc:[0-9]+ ", ".cc: ")).toList());
   }
 
   /** The calls of {@link #logsEachProblemOnce}, run in a child JVM whose stderr is read. */
   public static final class LogScenario {
     public static void main(String[] args) {
-      ByteBuffer context = context();
+      ByteBuffer context = ByteBuffer.allocateDirect(16);
       AudioResampler.createNativeResampler(context, 1, 1, 48000, false);
       AudioResampler.releaseNativeResampler(context);
       context = created(1, 48000, false);
       AudioResampler.setSourceSampleRate(context, 0);
       byte[] output = new byte[10];
-      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
-      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 5, false);
-      AudioResampler.resampleFromByteArray(context, pcm(1, 2), 0, 2, output, 1000, false);
-      AudioResampler.resampleFromByteBuffer(context, direct(pcm(1, 2)), 0, 8, output, 0, false);
-      context.putInt(8, 2);
-      AudioResampler.setVolume(context, 1, 1);
-      context.putInt(8, 1);
+      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
+      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
+      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 1000, false);
+      AudioResampler.resampleFromByteBuffer(context, direct(new byte[4]), 0, 8, output, 0, false);
       AudioResampler.releaseNativeResampler(context);
+
+      context = created(2, 48000, false);
+      context.putInt(8, 1);
+      AudioResampler.setVolume(context, 0, 0);
+      AudioResampler.releaseNativeResampler(context);
+      context.putInt(8, 2);
+      output = new byte[8];
+      AudioResampler.resampleFromByteArray(context, pcm("7 7 7 7"), 0, 4, output, 2, false);
+      System.out.println(Arrays.toString(samples(output)));
+      AudioResampler.releaseNativeResampler(context);
+      System.out.println(context.getLong(0));
     }
   }
 }
