@@ -29,7 +29,8 @@ class AlgorithmsTest {
       Arrays.sort(sorted);
       float expected = order > 0 ? sorted[nth - first] : sorted[last - 1 - nth];
       float[] copy = values.clone();
-      assertEquals(expected, Algorithms.nthElement(copy, first, nth, last, order), "round " + round);
+      assertEquals(expected, Algorithms.nthElement(copy, first, nth, last, order),
+          "round " + round);
       for (int i = 0; i < values.length; i++) {
         if (i < first || i >= last) assertEquals(values[i], copy[i], "outside element " + i);
       }

@@ -9,10 +9,7 @@ import java.util.ArrayList;
 import java.util.List;
 import java.util.concurrent.TimeUnit;
 
-/**
- * A main class run to completion in a fresh JVM, because the native log lines go to the
- * process's standard error, which a test cannot capture in its own JVM.
- */
+/** A main class run in a fresh JVM, whose stderr, where native log lines go, a test can read. */
 public record ChildJvm(String stdout, String stderr) {
   public static ChildJvm run(Class<?> mainClass, String... args) throws Exception {
     List<String> command = new ArrayList<>(List.of(

@@ -103,8 +103,7 @@ class DefaultLocalMusicDetailExtractorTest {
         + "|No onsets above the running median (silent or steady input): no beats to track."
         + "|Gets 0 beats from APM!# [0, 33]# 0",
     "oversized# PCM size 706600 bytes exceeds the buffer capacity of 705600 bytes; analysing"
-        + " the capacity.|Input samples size: 352800|Preprocess done. apm input size: 797|..."
-        + "|Estimated BPM = 120|Gets 16 beats from APM!"
+        + " the capacity.|Input samples size: 352800|...|Gets 16 beats from APM!"
         + "# [0, 4, 8, 12, 16, 20, 24, 28, 33, 37, 41, 45, 49, 53, 57, 61, 66, 86]# 16",
     "success# Input samples size: 352800|Preprocess done. apm input size: 797|..."
         + "|Estimated BPM = 120|Gets 16 beats from APM!"
@@ -247,21 +246,18 @@ class DefaultLocalMusicDetailExtractorTest {
     return out;
   }
 
-  private static float[] jittered(float[] beats, double jitter) {
-    Random random = new Random(7);
-    for (int i = 0; i < beats.length; i++) beats[i] += (float) (random.nextGaussian() * jitter);
-    return beats;
-  }
-
   private record Row(String name, float[] beats, double bpm, double tolerance) {}
 
   // Float beat times, as the extractor returns them, cost some precision.
   @Test
   void preciseTempoOfBeatLists() {
+    float[] jittered = beatTimes(0.3, 79, 0.5);
+    Random random = new Random(7);
+    for (int i = 0; i < jittered.length; i++) jittered[i] += (float) (random.nextGaussian() * 0.01);
     for (Row row :
         List.of(
             new Row("steady", beatTimes(0.3, 29, 0.5), 120, 1e-3),
-            new Row("jittered by 10 ms", jittered(beatTimes(0.3, 79, 0.5), 0.01), 120, 0.3),
+            new Row("jittered by 10 ms", jittered, 120, 0.3),
             new Row("one beat missing", beatTimes(0.3, 11, 0.5, 1, 1.0, 16, 0.5), 120, 1e-3),
             new Row("longer of two tempi", beatTimes(0.3, 39, 0.6, 60, 60 / 130.0), 130, 1e-3),
             new Row("three beats", beatTimes(0.3, 2, 0.4), 150, 1e-3),
