@@ -21,7 +21,7 @@ import org.junit.jupiter.params.provider.CsvSource;
 
 class DefaultLocalMusicDetailExtractorTest {
   /** Kicks on every beat from time 0, snares on 2 and 4, hi-hats off the beat; channels equal. */
-  static short[] groove(double seconds, int sampleRate, int channels, double bpm) {
+  static ByteBuffer groove(double seconds, int sampleRate, int channels, double bpm) {
     int frames = (int) Math.round(seconds * sampleRate);
     double[] mono = new double[frames];
     double beat = 60.0 / bpm;
@@ -31,12 +31,13 @@ class DefaultLocalMusicDetailExtractorTest {
       if (b % 2 == 1) addNoiseBurst(mono, sampleRate, b * beat, 0.12, 0.35, noise);
       addNoiseBurst(mono, sampleRate, (b + 0.5) * beat, 0.03, 0.12, noise);
     }
-    short[] pcm = new short[frames * channels];
+    ByteBuffer pcm = ByteBuffer.allocateDirect(2 * frames * channels);
+    pcm.order(ByteOrder.LITTLE_ENDIAN);
     for (int i = 0; i < frames; i++) {
       short s = (short) Math.max(-32768, Math.min(32767, Math.round(mono[i] * 20000)));
-      for (int c = 0; c < channels; c++) pcm[i * channels + c] = s;
+      for (int c = 0; c < channels; c++) pcm.putShort(s);
     }
-    return pcm;
+    return pcm.clear();
   }
 
   private static void addKick(double[] out, int rate, double at) {
@@ -58,12 +59,6 @@ class DefaultLocalMusicDetailExtractorTest {
       double t = (double) i / rate;
       out[start + i] += gain * (noise.nextDouble() * 2 - 1) * Math.exp(-t / decaySeconds);
     }
-  }
-
-  static ByteBuffer direct(short[] pcm) {
-    ByteBuffer buffer = ByteBuffer.allocateDirect(pcm.length * 2).order(ByteOrder.LITTLE_ENDIAN);
-    buffer.asShortBuffer().put(pcm);
-    return buffer;
   }
 
   private static final DefaultLocalMusicDetailExtractor EXTRACTOR =
@@ -132,7 +127,7 @@ class DefaultLocalMusicDetailExtractorTest {
       DefaultLocalMusicDetailExtractor extractor =
           new DefaultLocalMusicDetailExtractor(
               percent -> progress.add(percent) && cancelAt >= 0 && percent >= cancelAt);
-      ByteBuffer pcm = direct(groove(8, 44100, 1, 120));
+      ByteBuffer pcm = groove(8, 44100, 1, 120);
       int size = pcm.capacity();
       if (name.equals("one-byte")) size = 1;
       if (name.equals("shorter-than-window")) size = 200;
@@ -167,7 +162,7 @@ class DefaultLocalMusicDetailExtractorTest {
     "44100, 1, 441, 60, 50, 80", "44100, 1, 441, 180, 150, 210",
   })
   void findsTheBeatsOfAGroove(int rate, int channels, int step, double bpm, float min, float max) {
-    ByteBuffer pcm = direct(groove(30, rate, channels, bpm));
+    ByteBuffer pcm = groove(30, rate, channels, bpm);
     // The odd byte of a partial frame is left out.
     int size = pcm.capacity() - channels + 1;
     float[] beats = max == 0 ? beatsOf(pcm, size, rate, channels)
@@ -177,7 +172,7 @@ class DefaultLocalMusicDetailExtractorTest {
     // Periods are whole frames.
     assertEquals(expected, 60 / Tempo.precise(beats), 0.5 / Math.floor(frameRate));
     if (channels == 2) {
-      ByteBuffer mono = direct(groove(30, rate, 1, bpm));
+      ByteBuffer mono = groove(30, rate, 1, bpm);
       assertArrayEquals(beatsOf(mono, mono.capacity(), rate, 1), beats, "equal channels");
     }
   }
@@ -192,7 +187,7 @@ class DefaultLocalMusicDetailExtractorTest {
 
   @Test
   void anExceptionFromTheProgressMethodReachesTheCaller() {
-    ByteBuffer pcm = direct(groove(3, 44100, 1, 120));
+    ByteBuffer pcm = groove(3, 44100, 1, 120);
     DefaultLocalMusicDetailExtractor extractor = new DefaultLocalMusicDetailExtractor(p -> {
       throw new IllegalStateException("listener failed at " + p);
     });
@@ -216,9 +211,9 @@ class DefaultLocalMusicDetailExtractorTest {
   })
   void hostileSizesRatesAndChannelCounts(int capacity, int size, int rate, int channels,
       int beats) {
-    ByteBuffer groove = direct(groove(400000 / 2 / 44100.0, 44100, 1, 120));
+    ByteBuffer track = groove(400000 / 2 / 44100.0, 44100, 1, 120);
     ByteBuffer pcm = ByteBuffer.allocateDirect(capacity);
-    pcm.put(groove.limit(capacity)).clear();
+    pcm.put(track.limit(capacity)).clear();
     assertEquals(beats, beatsOf(pcm, size, rate, channels).length);
   }
 
@@ -228,10 +223,9 @@ class DefaultLocalMusicDetailExtractorTest {
   @CsvSource({"zeros, 0, 0, 0", "maximum, 32767, 32767, 1", "minimum, -32768, -32768, 1",
       "alternating, 32767, -32768, 1", "dc, 1234, 1234, 1"})
   void steadySignalsGiveAtMostTheStartingBeat(String kind, short even, short odd, int beats) {
-    short[] pcm = new short[44100 * 4];
-    for (int i = 0; i < pcm.length; i++) pcm[i] = i % 2 == 0 ? even : odd;
-    ByteBuffer buffer = direct(pcm);
-    assertArrayEquals(new float[beats], beatsOf(buffer, buffer.capacity(), 44100, 1), kind);
+    ByteBuffer pcm = ByteBuffer.allocateDirect(4 * 88200).order(ByteOrder.LITTLE_ENDIAN);
+    for (int i = 0; i < 4 * 44100; i++) pcm.putShort(2 * i, i % 2 == 0 ? even : odd);
+    assertArrayEquals(new float[beats], beatsOf(pcm, pcm.capacity(), 44100, 1), kind);
   }
 
   // Beats from `start` on, in runs of (count, period), each run following the last beat.
