@@ -98,6 +98,8 @@ public class AudioResamplerTest {
     "stereo, 2, false, 24000, 1, -0.5, 1000 -1000 2000 -2000 3000 -3000, , 7, false,"
         + " 0 0 500 250 1000 500 1500 750 2000 1000 2500 1250 0 0 - -",
     "no input, 2, true, 24000, 1, 1, , , 3, false, 0 0 0 0 0 0 - -",
+    // 1000 times 1e10 saturates to 2^31 - 1, whose low 16 bits are -1; a NaN product is 0.
+    "huge and NaN gains, 1, true, 48000, 1e10, NaN, 0 1000 0, , 3, false, 0 0 0 0 -1 0",
     // Accumulating ignores the frames to clear; -30000 + -15000 wraps to 20536.
     "accumulating, 1, true, 48000, 1, -0.5, 4 30000 0, 10 20 30 40 30000 -30000 5 5, 9, true,"
         + " 10 20 34 38 -5536 20536 5 5",
