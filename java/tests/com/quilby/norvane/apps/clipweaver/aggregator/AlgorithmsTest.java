@@ -13,6 +13,7 @@ import org.junit.jupiter.params.provider.CsvSource;
 class AlgorithmsTest {
   // Slices of random length and place, some with many ties, against a full
   // sort; the values around the slice would change answers if they took part.
+  // With NaN in every third place (one round in five) any member of the slice will do.
   @Test
   void agreesWithAFullSortOnRandomSlices() {
     Random random = new Random(42);
@@ -21,6 +22,8 @@ class AlgorithmsTest {
       float[] values = new float[1 + random.nextInt(300)];
       int distinct = random.nextBoolean() ? 5 : 1 << 20;
       for (int i = 0; i < values.length; i++) values[i] = random.nextInt(distinct) - distinct / 2f;
+      boolean nan = round % 5 == 4;
+      for (int i = 0; nan && i < values.length; i += 3) values[i] = Float.NaN;
       int first = random.nextInt(values.length);
       int last = first + 1 + random.nextInt(values.length - first);
       int nth = first + random.nextInt(last - first);
@@ -29,8 +32,12 @@ class AlgorithmsTest {
       Arrays.sort(sorted);
       float expected = order > 0 ? sorted[nth - first] : sorted[last - 1 - nth];
       float[] copy = values.clone();
-      assertEquals(expected, Algorithms.nthElement(copy, first, nth, last, order),
-          "round " + round);
+      float got = Algorithms.nthElement(copy, first, nth, last, order);
+      if (nan) {
+        assertTrue(Arrays.binarySearch(sorted, got) >= 0, "round " + round + ": " + got);
+      } else {
+        assertEquals(expected, got, "round " + round);
+      }
       for (int i = 0; i < values.length; i++) {
         if (i < first || i >= last) assertEquals(values[i], copy[i], "outside element " + i);
       }
@@ -40,15 +47,6 @@ class AlgorithmsTest {
     assertEquals(5f, Algorithms.select(new float[] {5, 1, 4, 2, 3}, 0, false));
     assertThrows(IndexOutOfBoundsException.class, () -> Algorithms.select(new float[0], 0, true));
     assertThrows(NullPointerException.class, () -> Algorithms.nthElement(null, 0, 0, 1, 1));
-  }
-
-  @Test
-  void nanGivesSomeMemberOfTheSlice() {
-    float[] values = {3, Float.NaN, 1, Float.NaN, 2, 0, Float.NaN};
-    for (int nth = 0; nth < values.length; nth++) {
-      float result = Algorithms.nthElement(values.clone(), 0, nth, values.length, 1);
-      assertTrue(Float.isNaN(result) || (result >= 0 && result <= 3 && result == (int) result));
-    }
   }
 
   @ParameterizedTest(name = "first {0}, nth {1}, last {2}")
