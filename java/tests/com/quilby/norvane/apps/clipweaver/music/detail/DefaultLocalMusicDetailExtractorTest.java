@@ -12,6 +12,7 @@ import java.nio.ByteOrder;
 import java.nio.file.Files;
 import java.nio.file.Path;
 import java.util.ArrayList;
+import java.util.Arrays;
 import java.util.List;
 import java.util.Random;
 import java.util.regex.Pattern;
@@ -228,39 +229,34 @@ class DefaultLocalMusicDetailExtractorTest {
     assertArrayEquals(new float[beats], beatsOf(pcm, pcm.capacity(), 44100, 1), kind);
   }
 
-  // Beats from `start` on, in runs of (count, period), each run following the last beat.
-  private static float[] beatTimes(double start, double... runs) {
-    List<Double> times = new ArrayList<>(List.of(start));
-    for (int r = 0; r < runs.length; r += 2) {
+  // Beats from a start time on in runs of (count, period), each run following
+  // the last beat, moved by Gaussian noise of the deviation given. Float beat
+  // times, as the extractor returns them, cost some precision.
+  @ParameterizedTest(name = "{0}")
+  @CsvSource({
+    "steady, 0, 0.3 29 0.5, 120, 1e-3",
+    "jittered by 10 ms, 0.01, 0.3 79 0.5, 120, 0.3",
+    "one beat missing, 0, 0.3 11 0.5 1 1.0 16 0.5, 120, 1e-3",
+    "longer of two tempi, 0, 0.3 39 0.6 60 0.46153846, 130, 1e-3",
+    "three beats, 0, 0.3 2 0.4, 150, 1e-3",
+    "settling at 107 BPM first, 0, 0 7 0.56 40 0.6, 100, 0.03",
+    "two beats, 0, 0.3 1 0.5, NaN, 0",
+    "nothing steady, 0, 0 1 0.5 1 0.8 1 0.3 1 1.1 1 0.3, NaN, 0",
+  })
+  void preciseTempoOfBeatLists(String name, double jitter, String runs, double bpm,
+      double tolerance) {
+    double[] r = Arrays.stream(runs.split(" ")).mapToDouble(Double::parseDouble).toArray();
+    List<Double> times = new ArrayList<>(List.of(r[0]));
+    for (int i = 1; i < r.length; i += 2) {
       double from = times.get(times.size() - 1);
-      for (int i = 1; i <= runs[r]; i++) times.add(from + i * runs[r + 1]);
+      for (int k = 1; k <= r[i]; k++) times.add(from + k * r[i + 1]);
     }
-    float[] out = new float[times.size()];
-    for (int i = 0; i < out.length; i++) out[i] = (float) (double) times.get(i);
-    return out;
-  }
-
-  private record Row(String name, float[] beats, double bpm, double tolerance) {}
-
-  // Float beat times, as the extractor returns them, cost some precision.
-  @Test
-  void preciseTempoOfBeatLists() {
-    float[] jittered = beatTimes(0.3, 79, 0.5);
     Random random = new Random(7);
-    for (int i = 0; i < jittered.length; i++) jittered[i] += (float) (random.nextGaussian() * 0.01);
-    for (Row row :
-        List.of(
-            new Row("steady", beatTimes(0.3, 29, 0.5), 120, 1e-3),
-            new Row("jittered by 10 ms", jittered, 120, 0.3),
-            new Row("one beat missing", beatTimes(0.3, 11, 0.5, 1, 1.0, 16, 0.5), 120, 1e-3),
-            new Row("longer of two tempi", beatTimes(0.3, 39, 0.6, 60, 60 / 130.0), 130, 1e-3),
-            new Row("three beats", beatTimes(0.3, 2, 0.4), 150, 1e-3),
-            new Row("settling at 107 BPM first", beatTimes(0, 7, 0.56, 40, 0.6), 100, 0.03),
-            new Row("two beats", beatTimes(0.3, 1, 0.5), Double.NaN, 0),
-            new Row("nothing steady", new float[] {0, 0.5f, 1.3f, 1.6f, 2.7f, 3f}, Double.NaN,
-                0))) {
-      assertEquals(row.bpm, Tempo.precise(row.beats), row.tolerance, row.name);
+    float[] beats = new float[times.size()];
+    for (int i = 0; i < beats.length; i++) {
+      beats[i] = (float) (times.get(i) + random.nextGaussian() * jitter);
     }
+    assertEquals(bpm, Tempo.precise(beats), tolerance);
   }
 
   // The native library reads the same table: both refuse the same ranges in
