@@ -119,65 +119,61 @@ public class AudioResamplerTest {
     }
   }
 
-  // Each case is a call that would read or write out of bounds, or whose
-  // context was rewritten (byte `at` set to `value`) so that its fields no
-  // longer match the instance: the output stays as it was.
+  // Each case is a call that would read or write out of bounds, or whose context is
+  // unusable: rewritten to disagree with its instance, too small, on the heap, missing or
+  // released. The output stays as it was; a second release is harmless.
   @ParameterizedTest(name = "{0}")
   @CsvSource({
-    "clearing beyond the output, 2, 0, 4, 40, 11, false, 0, 0",
-    "samples beyond the output, 2, 0, 882, 40, 0, true, 0, 0",
-    "negative offset, 2, -2, 4, 40, 2, false, 0, 0",
-    "negative length, 2, 0, -4, 40, 2, false, 0, 0",
-    "length beyond the input, 2, 2, 882, 4000, 2, false, 0, 0",
-    "offset beyond the input, 2, 1765, 0, 40, 2, false, 0, 0",
-    "huge length, 2, 0, 2147483647, 40, 2, false, 0, 0",
-    "negative clearing, 2, 0, 4, 400, -1, false, 0, 0",
-    "huge clearing, 2, 0, 4, 400, 2147483647, false, 0, 0",
-    "no channels, 0, 0, 4, 40, 2, false, 0, 0",
-    "negative channels, -2, 0, 4, 40, 2, false, 0, 0",
-    "channel count rewritten to 1, 2, 0, 882, 16000, 0, true, 8, 1",
-    "channel count rewritten to 0, 2, 0, 882, 16000, 0, true, 8, 0",
-    "stereo flag rewritten to 1, 2, 0, 882, 16000, 100, false, 12, 1",
-    "stereo flag rewritten to 2, 1, 0, 882, 16000, 100, false, 12, 2",
+    "clearing beyond the output, 2, 0, 4, 40, 11, false, fine",
+    "samples beyond the output, 2, 0, 882, 40, 0, true, fine",
+    "negative offset, 2, -2, 4, 40, 2, false, fine",
+    "negative length, 2, 0, -4, 40, 2, false, fine",
+    "length beyond the input, 2, 2, 882, 4000, 2, false, fine",
+    "offset beyond the input, 2, 1765, 0, 40, 2, false, fine",
+    "huge length, 2, 0, 2147483647, 40, 2, false, fine",
+    "negative clearing, 2, 0, 4, 400, -1, false, fine",
+    "huge clearing, 2, 0, 4, 400, 2147483647, false, fine",
+    "no channels, 0, 0, 4, 40, 2, false, fine",
+    "negative channels, -2, 0, 4, 40, 2, false, fine",
+    "input on the heap, 2, 0, 4, 100, 20, false, heap input",
+    "channel count rewritten to 1, 2, 0, 882, 16000, 0, true, channels 1",
+    "channel count rewritten to 0, 2, 0, 882, 16000, 0, true, channels 0",
+    "stereo flag rewritten to 1, 2, 0, 882, 16000, 100, false, flag 1",
+    "stereo flag rewritten to 2, 1, 0, 882, 16000, 100, false, flag 2",
+    "context of 8 bytes, 1, 0, 2, 20, 5, false, 8 bytes",
+    "context on the heap, 1, 0, 2, 20, 5, false, heap",
+    "no context, 1, 0, 2, 20, 5, false, none",
+    "released context, 1, 0, 2, 20, 5, false, released",
   })
-  void badBlocksWriteNothing(
-      String name, int channels, int offset, int length, int outputBytes, int frames,
-      boolean accumulate, int at, int value) {
+  void badCallsWriteNothing(String name, int channels, int offset, int length, int outputBytes,
+      int frames, boolean accumulate, String kind) {
     for (boolean fromBuffer : new boolean[] {false, true}) {
-      ByteBuffer context = created(channels, 48000, false);
-      if (at == 8) context.putInt(at, value);
-      if (at == 12) context.put(at, (byte) value);
-      byte[] output = filled(outputBytes);
-      resample(context, fromBuffer, new byte[1764], offset, length, output, frames, accumulate);
-      assertArrayEquals(filled(outputBytes), output, name + (fromBuffer ? " (buffer)" : ""));
-      context.putInt(8, channels).put(12, (byte) 0);
-      AudioResampler.releaseNativeResampler(context);
-    }
-  }
-
-  // Too small, not direct, missing, released (twice): every call is a no-op.
-  @Test
-  void unusableContextsAndInputsAreIgnored() {
-    ByteBuffer released = created(2, 48000, false);
-    AudioResampler.releaseNativeResampler(released);
-    for (ByteBuffer context :
-        new ByteBuffer[] {ByteBuffer.allocateDirect(8), ByteBuffer.allocate(16), null, released}) {
-      if (context != released) AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
+      if (kind.equals("heap input") && !fromBuffer) continue;
+      ByteBuffer context = switch (kind) {
+        case "8 bytes" -> ByteBuffer.allocateDirect(8);
+        case "heap" -> ByteBuffer.allocate(16);
+        case "none" -> null;
+        default -> ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
+      };
+      AudioResampler.createNativeResampler(context, 2, channels, 48000, false);
+      if (kind.equals("released")) AudioResampler.releaseNativeResampler(context);
+      if (kind.startsWith("channels ")) context.putInt(8, kind.charAt(9) - '0');
+      if (kind.startsWith("flag ")) context.put(12, (byte) (kind.charAt(5) - '0'));
       AudioResampler.setVolume(context, 1, 1);
-      AudioResampler.setSourceSampleRate(context, 44100);
-      byte[] output = filled(20);
-      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
-      assertArrayEquals(filled(20), output);
+      AudioResampler.setSourceSampleRate(context, 48000);
+      byte[] input = new byte[1764];
+      byte[] output = filled(outputBytes);
+      if (kind.equals("heap input")) {
+        AudioResampler.resampleFromByteBuffer(
+            context, ByteBuffer.wrap(input), offset, length, output, frames, accumulate);
+      } else {
+        resample(context, fromBuffer, input, offset, length, output, frames, accumulate);
+      }
+      assertArrayEquals(filled(outputBytes), output, name + (fromBuffer ? " (buffer)" : ""));
+      if (kind.matches("(channels|flag) .")) context.putInt(8, channels).put(12, (byte) 0);
       AudioResampler.releaseNativeResampler(context);
-      if (context != null && context.capacity() >= 8) assertEquals(0L, context.getLong(0));
+      if (context != null) assertEquals(0L, context.getLong(0));
     }
-
-    ByteBuffer context = created(2, 48000, false);
-    byte[] output = filled(100);
-    AudioResampler.resampleFromByteBuffer(
-        context, ByteBuffer.wrap(new byte[8]), 0, 4, output, 20, false);
-    assertArrayEquals(filled(100), output);
-    AudioResampler.releaseNativeResampler(context);
   }
 
   @Test
