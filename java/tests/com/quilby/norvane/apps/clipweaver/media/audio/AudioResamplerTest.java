@@ -74,7 +74,8 @@ public class AudioResamplerTest {
   // Raw entries and wrapper, from array and buffer: output at 48000 Hz, the frames asked
   // cleared unless accumulating, then the input mixed in, interpolated linearly between
   // neighbouring input frames, the first from the silent frame before the input. At
-  // 44100 Hz the weights are 0, 30105, 27443, 24780 and 22118 (of 32768).
+  // 44100 Hz the weights are 0, 30105, 27443, 24780 and 22118 (of 32768). Input before
+  // " | " is an earlier block, whose last frame takes the place of the silent one.
   @ParameterizedTest(name = "{0}")
   @CsvSource({
     "44100 Hz, 1, false, 44100, 1, 1, 1000 -2000 3000 -4000 0, , 5, false, 0 918 -1513 1781 -1725",
@@ -83,6 +84,8 @@ public class AudioResamplerTest {
         + " 0 0 250 1000 500 2000 750 3000 1000 4000 1250 5000 0 0 - -",
     "stereo, 2, false, 24000, 1, -0.5, 1000 -1000 2000 -2000 3000 -3000, , 7, false,"
         + " 0 0 500 250 1000 500 1500 750 2000 1000 2500 1250 0 0 - -",
+    "stereo after a block, 2, false, 24000, 1, -0.5, 5000 -5000 3000 -3000 | 1000 -1000 2000 -2000,"
+        + " , 4, false, 3000 1500 2000 1000 1000 500 1500 750",
     "no input, 2, true, 24000, 1, 1, , , 3, false, 0 0 0 0 0 0 - -",
     // 1000 times 1e10 saturates to 2^31 - 1, whose low 16 bits are -1; a NaN product is 0.
     "huge and NaN gains, 1, true, 48000, 1e10, NaN, 0 1000 0, , 3, false, 0 0 0 0 -1 0",
@@ -93,7 +96,9 @@ public class AudioResamplerTest {
   void clearsAndResamplesIntoTheOutput(String name, int channels, boolean stereo, int rate,
       float left, float right, String input, String before, int frames, boolean accumulate,
       String expected) {
-    byte[] block = pcm(input);
+    String[] blocks = input == null ? new String[] {null} : input.split(" [|] ");
+    byte[] earlier = pcm(blocks.length > 1 ? blocks[0] : null);
+    byte[] block = pcm(blocks[blocks.length - 1]);
     int length = block.length / 2;
     for (int offset : new int[] {0, 3}) {
       byte[] in = new byte[offset + block.length];
@@ -104,12 +109,14 @@ public class AudioResamplerTest {
           ByteBuffer context = created(channels, 48000, stereo);
           AudioResampler.setSourceSampleRate(context, rate);
           AudioResampler.setVolume(context, left, right);
+          resample(context, false, earlier, 0, earlier.length / 2, new byte[64], 0, false);
           resample(context, way == 1, in, offset, length, output, frames, accumulate);
           AudioResampler.releaseNativeResampler(context);
         } else {
           try (AudioResampler resampler = new AudioResampler(channels, 48000, stereo)) {
             resampler.setSourceSampleRate(rate);
             resampler.setVolume(left, right);
+            resampler.resample(earlier, 0, earlier.length / 2, new byte[64], 0, false);
             if (way == 2) resampler.resample(in, offset, length, output, frames, accumulate);
             else resampler.resample(direct(in), offset, length, output, frames, accumulate);
           }
