@@ -46,14 +46,12 @@ public class AudioResamplerTest {
     return bytes;
   }
 
-  private static void resample(ByteBuffer context, boolean fromBuffer, byte[] input, int offset,
-      int length, byte[] output, int frames, boolean accumulate) {
+  private static void resample(ByteBuffer context, boolean fromBuffer, byte[] in, int offset,
+      int length, byte[] out, int frames, boolean add) {
     if (fromBuffer) {
-      AudioResampler.resampleFromByteBuffer(
-          context, direct(input), offset, length, output, frames, accumulate);
+      AudioResampler.resampleFromByteBuffer(context, direct(in), offset, length, out, frames, add);
     } else {
-      AudioResampler.resampleFromByteArray(
-          context, input, offset, length, output, frames, accumulate);
+      AudioResampler.resampleFromByteArray(context, in, offset, length, out, frames, add);
     }
   }
 
