@@ -77,6 +77,9 @@ public class AudioResamplerTest {
   @ParameterizedTest(name = "{0}")
   @CsvSource({
     "44100 Hz, 1, false, 44100, 1, 1, 1000 -2000 3000 -4000 0, , 5, false, 0 918 -1513 1781 -1725",
+    // Negative steps round toward minus infinity.
+    "stereo at 44100 Hz, 2, false, 44100, 1, 1, 1000 -1000 -2000 2000 3000 -3000 -4000 4000 0 0,"
+        + " , 5, false, 0 0 918 -919 -1513 1512 1781 -1782 -1725 1724 - -",
     "mono, 1, false, 24000, 1, 1, 1000 2000 3000, , 8, false, 0 500 1000 1500 2000 2500 0 0 - -",
     "mono to stereo, 1, true, 24000, 0.5, 2, 1000 2000 3000, , 7, false,"
         + " 0 0 250 1000 500 2000 750 3000 1000 4000 1250 5000 0 0 - -",
