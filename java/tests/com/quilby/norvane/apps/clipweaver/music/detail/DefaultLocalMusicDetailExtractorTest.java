@@ -196,8 +196,8 @@ class DefaultLocalMusicDetailExtractorTest {
         () -> extractor.calculateBeatsInSec(pcm, pcm.capacity(), 44100, 1)).getMessage());
   }
 
-  // The start of a 4.5 s mono groove at 120 BPM in a direct buffer of
-  // `capacity` bytes, passed with the size, rate and channel count given.
+  // The start of a 4.5 s mono groove at 120 BPM in a direct buffer of `capacity` bytes,
+  // passed with the size, rate and channel count given: the number of beats found.
   @ParameterizedTest(name = "capacity {0}, size {1}, rate {2}, channels {3}")
   @CsvSource({
     "400000, -1, 44100, 2, 0", "400000, 0, 44100, 2, 0", "400000, -2147483648, 44100, 1, 0",
