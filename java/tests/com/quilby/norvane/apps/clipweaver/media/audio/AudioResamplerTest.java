@@ -19,11 +19,17 @@ import org.junit.jupiter.params.ParameterizedTest;
 import org.junit.jupiter.params.provider.CsvSource;
 
 public class AudioResamplerTest {
-  // Every byte starts as 0x5a, so that the reserved ones show whether they were written.
+  // A context checked on the way: instance, channel count and stereo flag stored, and the
+  // reserved bytes left as the 0x5a every byte starts as.
   private static ByteBuffer created(int channels, int rate, boolean stereoOutput) {
+    assertEquals(16, AudioResampler.getNativeResamplerContextSize());
     ByteBuffer context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
     for (int i = 0; i < 16; i++) context.put(i, (byte) 0x5a);
     AudioResampler.createNativeResampler(context, 2, channels, rate, stereoOutput);
+    assertNotEquals(0x5a5a5a5a5a5a5a5aL, context.getLong(0));
+    assertEquals(channels, context.getInt(8));
+    assertEquals(stereoOutput ? 1 : 0, context.get(12));
+    for (int i = 13; i < 16; i++) assertEquals(0x5a, context.get(i), "reserved byte " + i);
     return context;
   }
 
@@ -52,20 +58,6 @@ public class AudioResamplerTest {
       AudioResampler.resampleFromByteBuffer(context, direct(in), offset, length, out, frames, add);
     } else {
       AudioResampler.resampleFromByteArray(context, in, offset, length, out, frames, add);
-    }
-  }
-
-  @Test
-  void contextHoldsInstanceChannelCountAndStereoFlag() {
-    assertEquals(16, AudioResampler.getNativeResamplerContextSize());
-    for (int channels = 1; channels <= 2; channels++) {
-      ByteBuffer context = created(channels, 48000, channels == 1);
-      assertNotEquals(0x5a5a5a5a5a5a5a5aL, context.getLong(0));
-      assertEquals(channels, context.getInt(8));
-      assertEquals(channels == 1 ? 1 : 0, context.get(12));
-      for (int i = 13; i < 16; i++) assertEquals(0x5a, context.get(i), "reserved byte " + i);
-      AudioResampler.releaseNativeResampler(context);
-      assertEquals(0L, context.getLong(0));
     }
   }
 
@@ -113,6 +105,7 @@ public class AudioResamplerTest {
           resample(context, false, earlier, 0, earlier.length / 2, new byte[64], 0, false);
           resample(context, way == 1, in, offset, length, output, frames, accumulate);
           AudioResampler.releaseNativeResampler(context);
+          assertEquals(0L, context.getLong(0));
         } else {
           try (AudioResampler resampler = new AudioResampler(channels, 48000, stereo)) {
             resampler.setSourceSampleRate(rate);
@@ -252,11 +245,12 @@ public class AudioResamplerTest {
 
   /** The calls of {@link #logsEachProblemOnce}, run in a child JVM whose stderr is read. */
   public static final class LogScenario {
+    // Without JUnit on the class path, so without the checks of created().
     public static void main(String[] args) {
-      ByteBuffer context = ByteBuffer.allocateDirect(16);
+      ByteBuffer context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
       AudioResampler.createNativeResampler(context, 1, 1, 48000, false);
       AudioResampler.releaseNativeResampler(context);
-      context = created(1, 48000, false);
+      AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
       AudioResampler.setSourceSampleRate(context, 0);
       byte[] output = new byte[10];
       AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
@@ -265,7 +259,8 @@ public class AudioResamplerTest {
       AudioResampler.resampleFromByteBuffer(context, direct(new byte[4]), 0, 8, output, 0, false);
       AudioResampler.releaseNativeResampler(context);
 
-      context = created(2, 48000, false);
+      context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
+      AudioResampler.createNativeResampler(context, 2, 2, 48000, false);
       context.putInt(8, 1);
       AudioResampler.setVolume(context, 0, 0);
       AudioResampler.releaseNativeResampler(context);
