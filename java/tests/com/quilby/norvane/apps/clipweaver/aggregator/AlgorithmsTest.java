@@ -13,6 +13,7 @@ import org.junit.jupiter.params.provider.CsvSource;
 class AlgorithmsTest {
   // Slices of random length and place, some with many ties, against a full
   // sort; the values around the slice would change answers if they took part.
+  // With NaN in every third place (one round in five) any member of the slice will do.
   @Test
   void agreesWithAFullSortOnRandomSlices() {
     Random random = new Random(42);
@@ -21,6 +22,8 @@ class AlgorithmsTest {
       float[] values = new float[1 + random.nextInt(300)];
       int distinct = random.nextBoolean() ? 5 : 1 << 20;
       for (int i = 0; i < values.length; i++) values[i] = random.nextInt(distinct) - distinct / 2f;
+      boolean nan = round % 5 == 4;
+      for (int i = 0; nan && i < values.length; i += 3) values[i] = Float.NaN;
       int first = random.nextInt(values.length);
       int last = first + 1 + random.nextInt(values.length - first);
       int nth = first + random.nextInt(last - first);
@@ -29,7 +32,12 @@ class AlgorithmsTest {
       Arrays.sort(sorted);
       float expected = order > 0 ? sorted[nth - first] : sorted[last - 1 - nth];
       float[] copy = values.clone();
-      assertEquals(expected, Algorithms.nthElement(copy, first, nth, last, order), "round " + round);
+      float got = Algorithms.nthElement(copy, first, nth, last, order);
+      if (nan) {
+        assertTrue(Arrays.binarySearch(sorted, got) >= 0, "round " + round + ": " + got);
+      } else {
+        assertEquals(expected, got, "round " + round);
+      }
       for (int i = 0; i < values.length; i++) {
         if (i < first || i >= last) assertEquals(values[i], copy[i], "outside element " + i);
       }
@@ -37,15 +45,8 @@ class AlgorithmsTest {
     assertEquals(Float.NEGATIVE_INFINITY,
         Algorithms.select(new float[] {0, Float.NEGATIVE_INFINITY, -0f}, 0, true));
     assertEquals(5f, Algorithms.select(new float[] {5, 1, 4, 2, 3}, 0, false));
-  }
-
-  @Test
-  void nanGivesSomeMemberOfTheSlice() {
-    float[] values = {3, Float.NaN, 1, Float.NaN, 2, 0, Float.NaN};
-    for (int nth = 0; nth < values.length; nth++) {
-      float result = Algorithms.nthElement(values.clone(), 0, nth, values.length, 1);
-      assertTrue(Float.isNaN(result) || (result >= 0 && result <= 3 && result == (int) result));
-    }
+    assertThrows(IndexOutOfBoundsException.class, () -> Algorithms.select(new float[0], 0, true));
+    assertThrows(NullPointerException.class, () -> Algorithms.nthElement(null, 0, 0, 1, 1));
   }
 
   @ParameterizedTest(name = "first {0}, nth {1}, last {2}")
@@ -54,12 +55,9 @@ class AlgorithmsTest {
     "0, 0, -1", "-2147483648, 0, 3",
   })
   void indicesOutsideTheArrayThrow(int first, int nth, int last) {
-    IndexOutOfBoundsException e = assertThrows(IndexOutOfBoundsException.class,
-        () -> Algorithms.nthElement(new float[] {1, 2, 3}, first, nth, last, 1));
-    String message = e.getMessage();
-    assertTrue(message.contains("first " + first) && message.contains("nth " + nth)
-        && message.contains("last " + last) && message.contains("length 3"), message);
-    assertThrows(IndexOutOfBoundsException.class, () -> Algorithms.select(new float[0], 0, true));
-    assertThrows(NullPointerException.class, () -> Algorithms.nthElement(null, 0, 0, 1, 1));
+    assertEquals("nthElement: first " + first + ", nth " + nth + ", last " + last
+            + " outside 0 <= first <= nth < last <= length 3",
+        assertThrows(IndexOutOfBoundsException.class,
+            () -> Algorithms.nthElement(new float[] {1, 2, 3}, first, nth, last, 1)).getMessage());
   }
 }

@@ -1,29 +1,17 @@
 package com.quilby.norvane.apps.clipweaver.testing;
 
-import java.io.File;
-import java.io.IOException;
+import static org.junit.jupiter.api.Assertions.assertEquals;
+import static org.junit.jupiter.api.Assertions.assertTrue;
+
 import java.nio.file.Files;
+import java.nio.file.Path;
 import java.util.ArrayList;
 import java.util.List;
 import java.util.concurrent.TimeUnit;
 
-/**
- * Runs a main class in a fresh JVM, because the native log lines go to the
- * process's standard error, which a test cannot capture in its own JVM.
- */
-public final class ChildJvm {
-  public final int exitCode;
-  public final String stdout;
-  public final String stderr;
-
-  private ChildJvm(int exitCode, String stdout, String stderr) {
-    this.exitCode = exitCode;
-    this.stdout = stdout;
-    this.stderr = stderr;
-  }
-
-  public static ChildJvm run(Class<?> mainClass, String... args)
-      throws IOException, InterruptedException {
+/** A main class run in a fresh JVM, whose stderr, where native log lines go, a test can read. */
+public record ChildJvm(String stdout, String stderr) {
+  public static ChildJvm run(Class<?> mainClass, String... args) throws Exception {
     List<String> command = new ArrayList<>(List.of(
         System.getProperty("java.home") + "/bin/java",
         "-Djava.library.path=" + System.getProperty("java.library.path"),
@@ -31,29 +19,25 @@ public final class ChildJvm {
         mainClass.getName()));
     command.addAll(List.of(args));
     // Files rather than pipes: a chatty child cannot block on a full pipe.
-    File out = File.createTempFile("child", ".out");
-    File err = File.createTempFile("child", ".err");
+    Path out = Files.createTempFile("child", ".out");
+    Path err = Files.createTempFile("child", ".err");
+    Process process = new ProcessBuilder(command)
+        .redirectOutput(out.toFile()).redirectError(err.toFile()).start();
     try {
-      Process process = new ProcessBuilder(command).redirectInput(new File("/dev/null"))
-          .redirectOutput(out).redirectError(err).start();
-      if (!process.waitFor(300, TimeUnit.SECONDS)) {
-        process.destroyForcibly();
-        throw new IOException("child JVM timed out");
-      }
-      return new ChildJvm(process.exitValue(), Files.readString(out.toPath()),
-          Files.readString(err.toPath()));
+      assertTrue(process.waitFor(300, TimeUnit.SECONDS), "child JVM timed out");
+      ChildJvm child = new ChildJvm(Files.readString(out), Files.readString(err));
+      assertEquals(0, process.exitValue(), child.stderr);
+      return child;
     } finally {
-      out.delete();
-      err.delete();
+      process.destroyForcibly();
+      Files.delete(out);
+      Files.delete(err);
     }
   }
 
   /** The texts of the native log lines, without tag, file and line. */
   public List<String> nativeTexts() {
-    List<String> texts = new ArrayList<>();
-    for (String line : stderr.split("\n")) {
-      if (line.startsWith("native : ")) texts.add(line.substring(line.indexOf(' ', 9) + 1));
-    }
-    return texts;
+    return stderr.lines().filter(line -> line.startsWith("native : "))
+        .map(line -> line.substring(line.indexOf(' ', 9) + 1)).toList();
   }
 }
