@@ -3,25 +3,22 @@
 #include <gtest/gtest.h>
 
 #include <cstdint>
+#include <utility>
 #include <vector>
 
 namespace apm {
 namespace {
 
-struct Backtracked {
-  std::vector<int32_t> path;
+// The path and the rows with broken links, from the newest row down.
+std::pair<std::vector<int32_t>, std::vector<int32_t>> Backtrack(BeamHistory history,
+                                                                int32_t rows, int32_t state) {
   std::vector<int32_t> broken;
-};
-
-Backtracked Backtrack(BeamHistory* history, int32_t rows, int32_t state) {
-  Backtracked result;
   for (int32_t t = rows; t >= 1; --t) {
-    const bool linked = t > history->decided() ? history->Follow(t, &state)
-                                               : !history->WasBroken(t);
-    if (!linked) result.broken.push_back(t);
+    const bool linked =
+        t > history.decided() ? history.Follow(t, &state) : !history.WasBroken(t);
+    if (!linked) broken.push_back(t);
   }
-  result.path = history->path();
-  return result;
+  return {history.path(), broken};
 }
 
 // Random beams whose entries mostly descend from the best two of the last
@@ -35,37 +32,29 @@ TEST(BeamHistory, DroppingDecidedRowsKeepsEveryWayBack) {
     random = random * 1664525u + 1013904223u;
     return static_cast<int32_t>((random >> 8) % n);
   };
-  std::vector<std::vector<int32_t>> beams(kRows + 1, std::vector<int32_t>(kWidth));
-  std::vector<std::vector<int32_t>> predecessors(kRows + 1, std::vector<int32_t>(40, -1));
-  for (int32_t k = 0; k < kWidth; ++k) beams[0][k] = k;
-  for (int32_t t = 1; t <= kRows; ++t) {
-    for (int32_t k = 0; k < kWidth; ++k) {
-      const int32_t s = 8 * k + next(8);  // distinct within the beam
-      beams[t][k] = s;
-      const int32_t pick = next(100);
-      predecessors[t][s] = pick < 90   ? beams[t - 1][kWidth - 1 - next(2)]
-                           : pick < 97 ? beams[t - 1][next(kWidth)]
-                           : pick < 99 ? 39
-                                       : -1;
-    }
-  }
   BeamHistory compacted, full;
   compacted.Reset(kWidth, kRows, false);
   full.Reset(kWidth, kRows, true);
-  for (int32_t t = 1; t <= kRows; ++t) {
-    compacted.Append(beams[t].data(), predecessors[t].data());
-    full.Append(beams[t].data(), predecessors[t].data());
+  std::vector<int32_t> last = {0, 1, 2, 3, 4}, beam(kWidth), predecessor(40);
+  for (int32_t t = 1; t <= kRows; ++t, last = beam) {
+    for (int32_t k = 0; k < kWidth; ++k) {
+      const int32_t s = 8 * k + next(8);  // distinct within the beam
+      beam[k] = s;
+      const int32_t pick = next(100);
+      predecessor[s] = pick < 90   ? last[kWidth - 1 - next(2)]
+                       : pick < 97 ? last[next(kWidth)]
+                       : pick < 99 ? 39
+                                   : -1;
+    }
+    compacted.Append(beam.data(), predecessor.data());
+    full.Append(beam.data(), predecessor.data());
   }
   EXPECT_GT(compacted.decided(), kRows / 2);
   EXPECT_EQ(full.decided(), 0);
-  for (int32_t start : {-1, 0, 39, beams[kRows][0], beams[kRows][kWidth - 1]}) {
-    BeamHistory compacted_copy = compacted;
-    BeamHistory full_copy = full;
-    const Backtracked a = Backtrack(&compacted_copy, kRows, start);
-    const Backtracked b = Backtrack(&full_copy, kRows, start);
-    EXPECT_EQ(a.path, b.path) << start;
-    EXPECT_EQ(a.broken, b.broken) << start;
-    EXPECT_FALSE(b.broken.empty()) << start;
+  for (int32_t start : {-1, 0, 39, beam[0], beam[kWidth - 1]}) {
+    const auto expected = Backtrack(full, kRows, start);
+    EXPECT_EQ(Backtrack(compacted, kRows, start), expected) << start;
+    EXPECT_FALSE(expected.second.empty()) << start;
   }
 }
 

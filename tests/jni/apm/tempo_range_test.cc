@@ -63,21 +63,5 @@ TEST(TempoRange, ConfigSetsPeriodsAndPrior) {
   }
 }
 
-TEST(AnalysisFrameRate, TrueRateBesideTheTrackersWholeFrames) {
-  const struct {
-    double sample_rate;
-    int32_t step, frames_per_second;
-    double true_frames_per_second;
-  } rows[] = {{44100, 441, 100, 100.0}, {22050, 221, 99, 22050.0 / 221},
-              {11025, 110, 100, 11025.0 / 110}, {8000, 80, 100, 100.0},
-              {0, 0, 0, 0.0}, {2e6, 0, 0, 0.0}, {10, 0, 0, 0.0}};
-  for (const auto& row : rows) {
-    const AnalysisFrameRate rate = FrameRateAt(row.sample_rate);
-    EXPECT_EQ(rate.step, row.step) << row.sample_rate;
-    EXPECT_EQ(rate.frames_per_second, row.frames_per_second) << row.sample_rate;
-    EXPECT_EQ(rate.true_frames_per_second, row.true_frames_per_second) << row.sample_rate;
-  }
-}
-
 }  // namespace
 }  // namespace apm
