@@ -181,14 +181,10 @@ TEST(ApmRun, FastPathsMatchThePlainSearch) {
     random = random * 1664525u + 1013904223u;
     return static_cast<float>(random >> 8) / (1 << 24);
   };
-  const auto noise = [&](int n) {
+  // Uniform noise, or four levels of it: many equal scores.
+  const auto noise = [&](int n, bool levels = false) {
     std::vector<float> x(n);
-    for (float& v : x) v = uniform();
-    return x;
-  };
-  const auto levels = [&](int n) {  // few values, so many equal scores
-    std::vector<float> x(n);
-    for (float& v : x) v = 0.25f * (1 + static_cast<int>(uniform() * 4));
+    for (float& v : x) v = levels ? 0.25f * (1 + static_cast<int>(uniform() * 4)) : uniform();
     return x;
   };
   // A drifting tempo with missing and extra beats, a change of tempo, and
@@ -215,21 +211,21 @@ TEST(ApmRun, FastPathsMatchThePlainSearch) {
   const std::tuple<std::vector<float>, ApmConfig, int> cases[] = {
       {music, ApmConfig(), 100},
       {noise(3000), ApmConfig(), 100},
-      {levels(1000), ApmConfig(), 100},
+      {noise(1000, true), ApmConfig(), 100},
       {std::vector<float>(400, 0.5f), ApmConfig(), 100},
       {{0.3f, 1.0f}, ApmConfig(), 100},
       {noise(90), ApmConfig(), 100},
       {noise(600), With(&ApmConfig::value_slot_count, 1), 100},
-      {levels(3000), tiny, 1000},
+      {noise(3000, true), tiny, 1000},
       {noise(500), flat, 100},
-      {levels(250), ApmConfig(), 200},
+      {noise(250, true), ApmConfig(), 200},
       // Long table heads: many near lags, or none grouped.
       {noise(250), With(&ApmConfig::transition_sigma_ms, 45.0), 100},
       {noise(250), With(&ApmConfig::transition_sigma_ms, 80.0), 100},
       // NaN phase scores, so no score ever wins; sums that overflow.
       {noise(200), With(&ApmConfig::phase_deviation_weight, -1.0), 100},
       {noise(200), With(&ApmConfig::beat_bonus, 1e306), 100},
-      {levels(1500), narrow, 100}};
+      {noise(1500, true), narrow, 100}};
   int index = 0;
   for (const auto& [detection, config, fps] : cases) {
     ApmConfig plain = config;

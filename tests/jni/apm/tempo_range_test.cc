@@ -23,10 +23,7 @@ TEST(TempoRange, SharedCasesGiveTheirMessages) {
     if (line.empty() || line[0] == '#') continue;
     std::istringstream fields(line);
     std::string min, max, rate, message;
-    std::getline(fields, min, '\t');
-    std::getline(fields, max, '\t');
-    std::getline(fields, rate, '\t');
-    std::getline(fields, message);
+    std::getline(fields >> min >> max >> rate >> std::ws, message);
     // Through float, as the Java entry takes its range.
     const double min_bpm = static_cast<float>(std::strtod(min.c_str(), nullptr));
     const double max_bpm = static_cast<float>(std::strtod(max.c_str(), nullptr));
