@@ -18,9 +18,8 @@ TEST(OnsetDetector, ValuesFollowThePhasePrediction) {
   ASSERT_TRUE(detector.ComputeDetectionFunction({{{1, 0}}, {{0, 1}}, {{-1, 0}}}, &values,
                                                 kNoProgress, true));
   ASSERT_EQ(values.size(), 3u);
-  EXPECT_NEAR(values[0], 1.0f, 1e-6);
-  EXPECT_NEAR(values[1], std::sqrt(2.0f), 1e-6);
-  EXPECT_NEAR(values[2], 0.0f, 1e-6);
+  const float expected[] = {1.0f, std::sqrt(2.0f), 0.0f};
+  for (int t = 0; t < 3; ++t) EXPECT_NEAR(values[t], expected[t], 1e-6) << t;
 }
 
 // Thirteen bins run through every lane width the machine has (eight, four,

@@ -38,7 +38,6 @@ std::vector<double> OnFrames(std::vector<double> beats) {
 }
 
 TEST(PreciseTempo, BeatLists) {
-  const double none = NAN;
   const struct {
     const char* name;
     std::vector<double> beats;
@@ -58,10 +57,10 @@ TEST(PreciseTempo, BeatLists) {
       // the run would read 100.44 BPM.
       {"settling", Steady(40, 0.6, Steady(8, 0.56, {}, 0.0)), 100, 0.03},
       {"three beats", Steady(3, 0.4), 150, 1e-9},
-      {"two beats", Steady(2, 0.5), none, 0},
-      {"one beat", Steady(1, 0.5), none, 0},
-      {"no beats", {}, none, 0},
-      {"nothing steady", {0, 0.5, 1.3, 1.6, 2.7, 3.0}, none, 0},
+      {"two beats", Steady(2, 0.5), NAN, 0},
+      {"one beat", Steady(1, 0.5), NAN, 0},
+      {"no beats", {}, NAN, 0},
+      {"nothing steady", {0, 0.5, 1.3, 1.6, 2.7, 3.0}, NAN, 0},
   };
   for (const auto& row : rows) {
     const double bpm = PreciseTempo(row.beats);
