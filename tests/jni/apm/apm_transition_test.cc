@@ -76,23 +76,19 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEachState) {
     ASSERT_EQ(from, expected_from) << round;
   }
 
-  // Not finite, or large enough to overflow: left to the caller.
+  // Not finite, or large enough to overflow, in a base or a table: left to
+  // the caller.
   TransitionScorer grouped;
-  grouped.SetUp(3, 0, {-1.0}, {-1.0});
-  const int32_t lag[] = {0};
-  const int32_t offset[] = {0};
+  const int32_t zero[] = {0};
   const double observation[] = {0.0, 0.0, 0.0};
   double best[3];
   int32_t from[3];
-  for (double base :
-       {std::nan(""), std::numeric_limits<double>::infinity(), 1e301}) {
-    EXPECT_FALSE(grouped.ScoreOnBeat({&base, lag, offset, 1}, observation,
-                                     observation, best, from));
+  for (const auto& [base, period] :
+       {std::pair<double, double>{NAN, -1.0}, {INFINITY, -1.0}, {1e301, -1.0}, {0.0, NAN}}) {
+    grouped.SetUp(3, 0, {-1.0, period}, {-1.0});
+    EXPECT_FALSE(grouped.ScoreOnBeat({&base, zero, zero, 1}, observation, observation, best,
+                                     from)) << base;
   }
-  grouped.SetUp(3, 0, {-1.0, std::nan("")}, {-1.0});
-  const double base = 0.0;
-  EXPECT_FALSE(grouped.ScoreOnBeat({&base, lag, offset, 1}, observation,
-                                   observation, best, from));
 }
 
 }  // namespace
