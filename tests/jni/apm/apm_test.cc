@@ -141,9 +141,10 @@ TEST(ApmPlacement, WrappedOffsetsBeatsAndTempo) {
 
 TEST(ApmRun, FollowsPeaksAndThePullOfTheTempoPrior) {
   // Peaks 25 frames apart: every second one, nearer the prior's centre.
-  for (const auto& [spacing, beat_spacing, count] :
-       {std::tuple<int, int, size_t>{60, 60, 20}, {25, 50, 24}}) {
-    const Tracked r = Track(Peaks(1200, 30, spacing));
+  for (const auto& [spacing, beat_spacing, count, prior] :
+       {std::tuple<int, int, size_t, bool>{60, 60, 20, true}, {25, 50, 24, true},
+        {60, 60, 20, false}}) {
+    const Tracked r = Track(Peaks(1200, 30, spacing), With(&ApmConfig::use_tempo_prior, prior));
     const std::vector<double> times = r.tracker->beat_times();
     ASSERT_EQ(times.size(), count) << spacing;
     for (size_t i = 0; i < times.size(); ++i) {
