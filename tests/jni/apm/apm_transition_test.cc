@@ -70,8 +70,9 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEachState) {
       grouped.ScoreState(entries, j, 0, observation[j], prior[j], &expected_best[j],
                          &expected_from[j]);
     }
-    ASSERT_TRUE(grouped.ScoreOnBeat(entries, observation.data(), prior.data(), best.data(),
-                                    from.data())) << round;
+    ASSERT_TRUE(
+        grouped.ScoreOnBeat(entries, observation.data(), prior.data(), best.data(), from.data()))
+        << round;
     ASSERT_EQ(std::memcmp(best.data(), expected_best.data(), lags * sizeof(double)), 0) << round;
     ASSERT_EQ(from, expected_from) << round;
   }
@@ -86,8 +87,8 @@ TEST(ApmTransition, GroupedScoringMatchesScoringEachState) {
   for (const auto& [base, period] :
        {std::pair<double, double>{NAN, -1.0}, {INFINITY, -1.0}, {1e301, -1.0}, {0.0, NAN}}) {
     grouped.SetUp(3, 0, {-1.0, period}, {-1.0});
-    EXPECT_FALSE(grouped.ScoreOnBeat({&base, zero, zero, 1}, observation, observation, best,
-                                     from)) << base;
+    EXPECT_FALSE(grouped.ScoreOnBeat({&base, zero, zero, 1}, observation, observation, best, from))
+        << base;
   }
 }
 

@@ -76,7 +76,7 @@ struct Outcome {
 // One run over the first size bytes: in one call, or when block > 0 fed in
 // blocks of that many frames after announcing the given frame count.
 Outcome Analyze(const std::vector<int16_t>& pcm, int32_t size, int rate, int channels,
-            int cancel_at = 1000, int32_t block = 0, int64_t announced = 0) {
+                int cancel_at = 1000, int32_t block = 0, int64_t announced = 0) {
   Outcome run;
   AudioAnalyzer analyzer(rate);
   const auto progress = [&](char p) {

@@ -10,8 +10,8 @@ namespace apm {
 namespace {
 
 // The path and the rows with broken links, from the newest row down.
-std::pair<std::vector<int32_t>, std::vector<int32_t>> Backtrack(BeamHistory history,
-                                                                int32_t rows, int32_t state) {
+std::pair<std::vector<int32_t>, std::vector<int32_t>> Backtrack(BeamHistory history, int32_t rows,
+                                                                int32_t state) {
   std::vector<int32_t> broken;
   for (int32_t t = rows; t >= 1; --t) {
     const bool linked =

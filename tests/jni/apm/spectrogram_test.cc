@@ -20,7 +20,8 @@ std::vector<float> Noise(size_t count, unsigned seed) {
 }
 
 TEST(SpectrogramHelpers, PowerOfTwoAndPeriodicHann) {
-  for (auto [n, expected] : {std::pair{-5, 0}, {0, 0}, {1, 1}, {3, 4}, {1764, 2048}, {2048, 2048}}) {
+  for (auto [n, expected] :
+       {std::pair{-5, 0}, {0, 0}, {1, 1}, {3, 4}, {1764, 2048}, {2048, 2048}}) {
     EXPECT_EQ(NextPowerOfTwo(n), expected) << n;
   }
   std::vector<double> window;
