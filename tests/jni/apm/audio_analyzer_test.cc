@@ -2,8 +2,12 @@
 
 #include <gtest/gtest.h>
 
+#include <sys/mman.h>
+#include <unistd.h>
+
 #include <algorithm>
 #include <cmath>
+#include <cstring>
 #include <string>
 #include <vector>
 
@@ -25,6 +29,10 @@ TEST(Conditioning, RunningMedianSeesRewrittenValuesOnItsLeft) {
   std::vector<float> spike(401, 0.0f);
   spike[200] = 3.5f;
   EXPECT_EQ(Conditioned(201, spike), spike);
+  // A NaN later on leaves the values before it conditioned as ever.
+  const std::vector<float> with_nan = Conditioned(3, {5, 1, 1, NAN});
+  EXPECT_EQ(std::vector<float>(with_nan.begin(), with_nan.begin() + 2),
+            (std::vector<float>{0, 0}));
 }
 
 // Against a selection over each window, on values with many ties, windows
@@ -154,6 +162,45 @@ TEST(AudioAnalyzer, ProgressFailuresAndCancellation) {
     EXPECT_EQ(run.progress, row.progress) << row.log;
     EXPECT_NE(run.log.find(row.log), std::string::npos) << row.log;
   }
+}
+
+// The input ends where an unreadable page begins, so that a read past its
+// last frame faults instead of passing unseen.
+TEST(AudioAnalyzer, ReadsNothingPastTheInput) {
+  const size_t page = static_cast<size_t>(sysconf(_SC_PAGESIZE));
+  for (int channels : {1, 2, 3}) {
+    const std::vector<int16_t> pcm = test_signals::Clicks(8000, channels, 3, 0.5);
+    const size_t bytes = 2 * pcm.size();
+    const size_t span = (bytes + page - 1) / page * page;
+    void* pages = mmap(nullptr, span + page, PROT_READ | PROT_WRITE,
+                       MAP_PRIVATE | MAP_ANONYMOUS, -1, 0);
+    ASSERT_NE(pages, MAP_FAILED);
+    uint8_t* end = static_cast<uint8_t*>(pages) + span;
+    ASSERT_EQ(mprotect(end, page, PROT_NONE), 0);
+    std::memcpy(end - bytes, pcm.data(), bytes);
+    AudioAnalyzer analyzer(8000);
+    testing::internal::CaptureStderr();
+    const int32_t count = analyzer.CalculateBeats(end - bytes, static_cast<int32_t>(bytes),
+                                                  channels, [](char) { return false; });
+    testing::internal::GetCapturedStderr();
+    EXPECT_EQ(std::vector<float>(analyzer.beats(), analyzer.beats() + count),
+              Analyze(pcm, Bytes(pcm), 8000, channels).beats) << channels;
+    munmap(pages, span + page);
+  }
+}
+
+TEST(AudioAnalyzer, AStoppedRunIgnoresLaterBlocks) {
+  const std::vector<int16_t> pcm = test_signals::Clicks(8000, 2, 3, 0.5);
+  const int32_t frames = static_cast<int32_t>(pcm.size() / 2);
+  int calls = 0;
+  AudioAnalyzer analyzer(8000);
+  testing::internal::CaptureStderr();
+  ASSERT_TRUE(analyzer.Begin(2, frames, [&calls](char) { return calls++ == 0; }));
+  EXPECT_FALSE(analyzer.Feed(pcm.data(), frames));
+  EXPECT_FALSE(analyzer.Feed(pcm.data(), frames));
+  EXPECT_EQ(analyzer.Finish(), -1);
+  testing::internal::GetCapturedStderr();
+  EXPECT_EQ(calls, 1);
 }
 
 }  // namespace

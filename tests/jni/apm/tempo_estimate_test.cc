@@ -57,6 +57,8 @@ TEST(PreciseTempo, BeatLists) {
       // the run would read 100.44 BPM.
       {"settling", Steady(40, 0.6, Steady(8, 0.56, {}, 0.0)), 100, 0.03},
       {"three beats", Steady(3, 0.4), 150, 1e-9},
+      // The median of an even count is the upper middle: 2 s, not 1 s.
+      {"1 s twice, then 2 s twice", {0, 1, 2, 4, 6}, 30, 1e-9},
       {"two beats", Steady(2, 0.5), NAN, 0},
       {"one beat", Steady(1, 0.5), NAN, 0},
       {"no beats", {}, NAN, 0},
