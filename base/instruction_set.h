@@ -11,8 +11,8 @@
 // The vector vocabularies take SSE2 or NEON where the target has them. A
 // build defining CLIPWEAVER_PLAIN_VECTORS takes their plain-array forms, the
 // ones other targets (32-bit ARM among them) run, so that any machine can
-// test those too.
-#if defined(CLIPWEAVER_PLAIN_VECTORS)
+// test those too. The AVX kernels are written over SSE2 and keep it.
+#if defined(CLIPWEAVER_PLAIN_VECTORS) && !defined(__AVX__)
 #elif defined(__SSE2__)
 #define CLIPWEAVER_SSE2 1
 #elif defined(__ARM_NEON) && defined(__aarch64__)
