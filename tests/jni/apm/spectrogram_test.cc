@@ -50,9 +50,9 @@ TEST(Spectrogram, RejectsBadSettingsAndRecovers) {
                            " Window length too long.\n"}) {
     EXPECT_NE(log.find(line), std::string::npos) << line;
   }
-  EXPECT_TRUE(spectrogram.Initialize(4, 2));
-  EXPECT_TRUE(spectrogram.ComputeComplexSpectrogram({1, 2, 3, 4}, &frames, kNoProgress));
-  EXPECT_EQ(frames.size(), 1u);
+  EXPECT_TRUE(spectrogram.Initialize(4, 1));  // the shortest step
+  EXPECT_TRUE(spectrogram.ComputeComplexSpectrogram({1, 2, 3, 4, 5}, &frames, kNoProgress));
+  EXPECT_EQ(frames.size(), 2u);
 }
 
 // Windows read in place, gathered across pieces, and skipped over when the
