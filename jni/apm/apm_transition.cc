@@ -131,8 +131,7 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
       std::ldexp(bound, -50) + 16 * std::numeric_limits<double>::denorm_min();
   margin_ =
       std::ldexp(bound, -46) + 16 * std::numeric_limits<double>::denorm_min();
-  Order(entries);
-  Keep();
+  Keep(entries);
   FindLeader();
   std::fill_n(best, lag_count_, -std::numeric_limits<double>::infinity());
   std::fill_n(from, lag_count_, entries.count);
@@ -172,57 +171,61 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
 }
 
 // Entries by descending base. The beam comes out of the selection in
-// ascending order of value, so this is usually a reversal.
-void TransitionScorer::Order(const BeamEntries& entries) {
+// ascending order of value, so this is usually a reversal, taken without
+// an index table.
+void TransitionScorer::Keep(const BeamEntries& entries) {
   const int32_t count = entries.count;
   const double* base = entries.base;
-  order_.resize(count);
   bool ascending = true;
-  for (int32_t k = 0; k < count; ++k) {
-    order_[k] = count - 1 - k;
-    ascending &= k == 0 || base[k - 1] <= base[k];
-  }
-  if (!ascending) {
+  for (int32_t k = 1; k < count; ++k) ascending &= base[k - 1] <= base[k];
+  if (ascending) {
+    KeepInOrder(entries, [count](int32_t i) { return count - 1 - i; });
+  } else {
+    order_.resize(count);
+    for (int32_t k = 0; k < count; ++k) order_[k] = count - 1 - k;
     std::sort(order_.begin(), order_.end(),
               [base](int32_t a, int32_t b) { return base[a] > base[b]; });
+    KeepInOrder(entries, [this](int32_t i) { return order_[i]; });
   }
-  sorted_.resize(count);
-  for (int32_t i = 0; i < count; ++i) {
-    const int32_t e = order_[i];
-    sorted_[i] = {base[e], entries.lag[e], entries.offset[e], e};
+  // Kept entries by class, keeping their order within a class.
+  const int32_t class_count = phase_tail_ + 1;
+  for (int32_t q = 0; q < class_count; ++q) {
+    class_start_[q + 1] += class_start_[q];
+  }
+  by_class_.resize(kept_count_);
+  fill_.assign(class_start_.begin(), class_start_.end() - 1);
+  for (int32_t i = 0; i < kept_count_; ++i) {
+    by_class_[fill_[kept_[i].phase_class]++] = i;
   }
 }
 
-void TransitionScorer::Keep() {
+// Entry index(i) is the i-th by descending base.
+template <typename Index>
+void TransitionScorer::KeepInOrder(const BeamEntries& entries, Index index) {
   seen_.NextGeneration();
-  const int32_t count = static_cast<int32_t>(sorted_.size());
-  if (kept_.size() < sorted_.size()) kept_.resize(sorted_.size());
+  const int32_t count = entries.count;
+  if (kept_.size() < static_cast<size_t>(count)) kept_.resize(count);
   const int32_t class_count = phase_tail_ + 1;
   class_start_.assign(class_count + 1, 0);
   int32_t kept = 0;
+  // Whether the entry is within delta of the one before, and of the one
+  // after: the same difference serves both entries of a pair.
+  bool close_before = false;
   for (int32_t i = 0; i < count; ++i) {
-    const Entry& e = sorted_[i];
-    const bool crowded =
-        (i > 0 && sorted_[i - 1].base - e.base <= delta_) |
-        (i + 1 < count && e.base - sorted_[i + 1].base <= delta_);
-    const int32_t phase_class = std::min(std::abs(e.offset), phase_tail_);
-    const bool first =
-        seen_.Mark(static_cast<size_t>(e.lag) * class_count + phase_class);
+    const int32_t e = index(i);
+    const double base = entries.base[e];
+    const bool close_after = i + 1 < count && base - entries.base[index(i + 1)] <= delta_;
+    const bool crowded = close_before | close_after;
+    close_before = close_after;
+    const int32_t lag = entries.lag[e];
+    const int32_t phase_class = std::min(std::abs(entries.offset[e]), phase_tail_);
+    const bool first = seen_.Mark(static_cast<size_t>(lag) * class_count + phase_class);
     // Written in any case, counted only when kept: fewer branches.
-    kept_[kept] = {e.base, e.lag, phase_class, e.entry, crowded};
+    kept_[kept] = {base, lag, phase_class, e, crowded};
     class_start_[phase_class + 1] += first | crowded;
     kept += first | crowded;
   }
   kept_count_ = kept;
-  // Kept entries by class, keeping their order within a class.
-  for (int32_t q = 0; q < class_count; ++q) {
-    class_start_[q + 1] += class_start_[q];
-  }
-  by_class_.resize(kept);
-  fill_.assign(class_start_.begin(), class_start_.end() - 1);
-  for (int32_t i = 0; i < kept; ++i) {
-    by_class_[fill_[kept_[i].phase_class]++] = i;
-  }
 }
 
 void TransitionScorer::FindLeader() {
