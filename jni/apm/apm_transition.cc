@@ -199,30 +199,40 @@ void TransitionScorer::Keep(const BeamEntries& entries) {
   }
 }
 
-// Entry index(i) is the i-th by descending base.
+// Entry index(i) is the i-th by descending base. Members are read into
+// locals first: the stores of the loop could alias them for all the
+// compiler knows.
 template <typename Index>
 void TransitionScorer::KeepInOrder(const BeamEntries& entries, Index index) {
   seen_.NextGeneration();
+  const GenerationMarks::Marker seen = seen_.Hold();
   const int32_t count = entries.count;
   if (kept_.size() < static_cast<size_t>(count)) kept_.resize(count);
-  const int32_t class_count = phase_tail_ + 1;
+  const int32_t phase_tail = phase_tail_;
+  const int32_t class_count = phase_tail + 1;
   class_start_.assign(class_count + 1, 0);
+  int32_t* const class_end = class_start_.data() + 1;
+  Kept* const out = kept_.data();
+  const double* const bases = entries.base;
+  const int32_t* const lags = entries.lag;
+  const int32_t* const offsets = entries.offset;
+  const double delta = delta_;
   int32_t kept = 0;
   // Whether the entry is within delta of the one before, and of the one
   // after: the same difference serves both entries of a pair.
   bool close_before = false;
   for (int32_t i = 0; i < count; ++i) {
     const int32_t e = index(i);
-    const double base = entries.base[e];
-    const bool close_after = i + 1 < count && base - entries.base[index(i + 1)] <= delta_;
+    const double base = bases[e];
+    const bool close_after = i + 1 < count && base - bases[index(i + 1)] <= delta;
     const bool crowded = close_before | close_after;
     close_before = close_after;
-    const int32_t lag = entries.lag[e];
-    const int32_t phase_class = std::min(std::abs(entries.offset[e]), phase_tail_);
-    const bool first = seen_.Mark(static_cast<size_t>(lag) * class_count + phase_class);
+    const int32_t lag = lags[e];
+    const int32_t phase_class = std::min(std::abs(offsets[e]), phase_tail);
+    const bool first = seen.Mark(static_cast<size_t>(lag) * class_count + phase_class);
     // Written in any case, counted only when kept: fewer branches.
-    kept_[kept] = {base, lag, phase_class, e, crowded};
-    class_start_[phase_class + 1] += first | crowded;
+    out[kept] = {base, lag, phase_class, e, crowded};
+    class_end[phase_class] += first | crowded;
     kept += first | crowded;
   }
   kept_count_ = kept;
