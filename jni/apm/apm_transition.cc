@@ -60,6 +60,26 @@ bool Bounded(const double* v, size_t n, double* max_abs) {
   return true;
 }
 
+// Bounded for the bases of a beam of count >= 1 entries, telling on the
+// way whether they ascend: the beam's usual order, which Keep takes as it
+// is then.
+bool BoundedBases(const double* base, int32_t count, double* max_abs,
+                  bool* ascending) {
+  double largest = 0.0;
+  double previous = base[0];
+  bool up = true;
+  for (int32_t k = 0; k < count; ++k) {
+    const double a = std::abs(base[k]);
+    if (!(a <= kLargest)) return false;
+    largest = std::max(largest, a);
+    up &= previous <= base[k];
+    previous = base[k];
+  }
+  *max_abs = largest;
+  *ascending = up;
+  return true;
+}
+
 // In any order of offers this keeps the first entry with the largest
 // score, as a pass in beam order with a strict comparison does.
 // Without branches: whether an offer wins is hard to predict.
@@ -113,8 +133,9 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
   double base_max = 0.0;
   double observation_max = 0.0;
   double prior_max = 0.0;
+  bool ascending = false;
   if (!usable_ || entries.count < 1 ||
-      !Bounded(entries.base, entries.count, &base_max) ||
+      !BoundedBases(entries.base, entries.count, &base_max, &ascending) ||
       !Bounded(observation, lag_count_, &observation_max) ||
       !Bounded(prior, lag_count_, &prior_max)) {
     return false;
@@ -131,7 +152,7 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
       std::ldexp(bound, -50) + 16 * std::numeric_limits<double>::denorm_min();
   margin_ =
       std::ldexp(bound, -46) + 16 * std::numeric_limits<double>::denorm_min();
-  Keep(entries);
+  Keep(entries, ascending);
   FindLeader();
   std::fill_n(best, lag_count_, -std::numeric_limits<double>::infinity());
   std::fill_n(from, lag_count_, entries.count);
@@ -173,11 +194,9 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
 // Entries by descending base. The beam comes out of the selection in
 // ascending order of value, so this is usually a reversal, taken without
 // an index table.
-void TransitionScorer::Keep(const BeamEntries& entries) {
+void TransitionScorer::Keep(const BeamEntries& entries, bool ascending) {
   const int32_t count = entries.count;
   const double* base = entries.base;
-  bool ascending = true;
-  for (int32_t k = 1; k < count; ++k) ascending &= base[k - 1] <= base[k];
   if (ascending) {
     KeepInOrder(entries, [count](int32_t i) { return count - 1 - i; });
   } else {

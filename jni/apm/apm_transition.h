@@ -60,7 +60,7 @@ class TransitionScorer {
     bool crowded;
   };
 
-  void Keep(const BeamEntries& entries);
+  void Keep(const BeamEntries& entries, bool ascending);
   template <typename Index>
   void KeepInOrder(const BeamEntries& entries, Index index);
   void FindLeader();
