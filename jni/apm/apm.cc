@@ -323,10 +323,10 @@ void Apm::Transition(int32_t cur, int32_t next, int32_t active) {
     TransitionOneByOne(cur, next, active);
   } else {
     const double* values = values_.row(cur);
+    const double bonus = config_.beat_bonus;
     for (int32_t k = 0; k < active; ++k) {
       const int32_t f = beam_[k];
-      entry_base_[k] =
-          config_.beat_bonus + (values[f] == kUnreached ? 0.0 : values[f]);
+      entry_base_[k] = bonus + (values[f] == kUnreached ? 0.0 : values[f]);
       entry_lag_[k] = state_lag_[f] - min_lag_;
       entry_offset_[k] = Offset(f);
     }
