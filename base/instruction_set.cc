@@ -16,13 +16,4 @@ bool HasAvx() {
 #endif
 }
 
-bool HasAvx2() {
-#if defined(__x86_64__) && defined(__GNUC__)
-  static const bool has_avx2 = HasAvx() && __builtin_cpu_supports("avx2");
-  return has_avx2;
-#else
-  return false;
-#endif
-}
-
 }  // namespace instruction_set

@@ -32,9 +32,6 @@ namespace instruction_set {
 // machine too).
 bool HasAvx();
 
-// True where AVX2 is there as well, under the same switch.
-bool HasAvx2();
-
 }  // namespace instruction_set
 
 #endif  // CLIPWEAVER_BASE_INSTRUCTION_SET_H_

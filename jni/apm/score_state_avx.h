@@ -1,6 +1,5 @@
 // The loop of TransitionScorer::ScoreState four entries at a time, built
-// apart with AVX; where AVX2 runs, it gathers the table terms. Call only
-// where instruction_set::HasAvx().
+// apart with AVX. Call only where instruction_set::HasAvx().
 #ifndef CLIPWEAVER_JNI_APM_SCORE_STATE_AVX_H_
 #define CLIPWEAVER_JNI_APM_SCORE_STATE_AVX_H_
 
