@@ -44,6 +44,11 @@ inline void LoadComplex(const float* p, float* re, float* im) {
   *re = p[0];
   *im = p[1];
 }
+// The same from doubles, each rounded to the nearest float.
+inline void LoadComplex(const double* p, float* re, float* im) {
+  *re = static_cast<float>(p[0]);
+  *im = static_cast<float>(p[1]);
+}
 
 #if defined(CLIPWEAVER_SSE2)
 
@@ -70,6 +75,13 @@ inline Float4 OneIfZero(Float4 a) {
 inline void LoadComplex(const float* p, Float4* re, Float4* im) {
   const __m128 low = _mm_loadu_ps(p);
   const __m128 high = _mm_loadu_ps(p + 4);
+  re->v = _mm_shuffle_ps(low, high, _MM_SHUFFLE(2, 0, 2, 0));
+  im->v = _mm_shuffle_ps(low, high, _MM_SHUFFLE(3, 1, 3, 1));
+}
+inline void LoadComplex(const double* p, Float4* re, Float4* im) {
+  const __m128 low = _mm_movelh_ps(_mm_cvtpd_ps(_mm_loadu_pd(p)), _mm_cvtpd_ps(_mm_loadu_pd(p + 2)));
+  const __m128 high =
+      _mm_movelh_ps(_mm_cvtpd_ps(_mm_loadu_pd(p + 4)), _mm_cvtpd_ps(_mm_loadu_pd(p + 6)));
   re->v = _mm_shuffle_ps(low, high, _MM_SHUFFLE(2, 0, 2, 0));
   im->v = _mm_shuffle_ps(low, high, _MM_SHUFFLE(3, 1, 3, 1));
 }
@@ -102,6 +114,12 @@ inline void LoadComplex(const float* p, Float4* re, Float4* im) {
   const float32x4x2_t pairs = vld2q_f32(p);
   re->v = pairs.val[0];
   im->v = pairs.val[1];
+}
+inline void LoadComplex(const double* p, Float4* re, Float4* im) {
+  const float64x2x2_t low = vld2q_f64(p);
+  const float64x2x2_t high = vld2q_f64(p + 4);
+  re->v = vcombine_f32(vcvt_f32_f64(low.val[0]), vcvt_f32_f64(high.val[0]));
+  im->v = vcombine_f32(vcvt_f32_f64(low.val[1]), vcvt_f32_f64(high.val[1]));
 }
 
 #else
@@ -142,6 +160,12 @@ inline void LoadComplex(const float* p, Float4* re, Float4* im) {
   for (int i = 0; i < 4; ++i) {
     re->v[i] = p[2 * i];
     im->v[i] = p[2 * i + 1];
+  }
+}
+inline void LoadComplex(const double* p, Float4* re, Float4* im) {
+  for (int i = 0; i < 4; ++i) {
+    re->v[i] = static_cast<float>(p[2 * i]);
+    im->v[i] = static_cast<float>(p[2 * i + 1]);
   }
 }
 

@@ -47,6 +47,21 @@ inline void LoadComplex(const float* p, Float8* re, Float8* im) {
   re->v = _mm256_shuffle_ps(first, second, _MM_SHUFFLE(2, 0, 2, 0));
   im->v = _mm256_shuffle_ps(first, second, _MM_SHUFFLE(3, 1, 3, 1));
 }
+// The same from doubles, each rounded to the nearest float: four pairs
+// convert into each half.
+inline void LoadComplex(const double* p, Float8* re, Float8* im) {
+  const __m256 first = _mm256_insertf128_ps(
+      _mm256_castps128_ps256(_mm256_cvtpd_ps(_mm256_loadu_pd(p))),
+      _mm256_cvtpd_ps(_mm256_loadu_pd(p + 8)), 1);
+  const __m256 second = _mm256_insertf128_ps(
+      _mm256_castps128_ps256(_mm256_cvtpd_ps(_mm256_loadu_pd(p + 4))),
+      _mm256_cvtpd_ps(_mm256_loadu_pd(p + 12)), 1);
+  re->v = _mm256_shuffle_ps(first, second, _MM_SHUFFLE(2, 0, 2, 0));
+  im->v = _mm256_shuffle_ps(first, second, _MM_SHUFFLE(3, 1, 3, 1));
+}
+// Lanes 0-3 and 4-7.
+inline Float4 LowHalf(Float8 a) { return {_mm256_castps256_ps128(a.v)}; }
+inline Float4 HighHalf(Float8 a) { return {_mm256_extractf128_ps(a.v, 1)}; }
 
 }  // namespace CLIPWEAVER_ISA
 }  // namespace simd

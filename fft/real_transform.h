@@ -112,21 +112,39 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
     V w;
   };
   Twiddles pending{0, Splat<V>(0)};
+  // The places and split weights of group k0 = pending.k, moved on by
+  // each pair: worked out from k0 every time, they cost more than the
+  // butterflies.
+  double* up = a + 2;
+  double* down = a + im - 2;
+  double* mid_down = a + h - 2;
+  double* mid_up = a + h + 2;
+  const double* c_up = c + step;
+  const double* c_down = c_end - step;
+  const double* half_down = c_half - step;
+  const double* half_up = c_half + step;
   ForEachTwiddle<V>(2 * h, tw, [&](std::ptrdiff_t k, V w, V) {
     if constexpr (!std::is_same_v<V, W>) {
       if (k % 2) {
         pending = {k, w};
         return;
       }
-      const std::ptrdiff_t k0 = pending.k, kk0 = k0 * step, kk = k * step;
       pending.k = 0;
       const W both = Join(pending.w, w), negated = Neg(both);
       CombinePair<W, kForward, 1, -1>(
-          a + 2 * k0, a + im - 2 * k0, im, UnpackLow(both, negated), DupHigh(both),
-          Join(Make<V>(c[kk0], c_end[-kk0]), Make<V>(c[kk], c_end[-kk])));
+          up, down, im, UnpackLow(both, negated), DupHigh(both),
+          Join(Make<V>(c_up[0], c_down[0]), Make<V>(c_up[step], c_down[-step])));
       CombinePair<W, kForward, -1, 1>(
-          a + h - 2 * k0, a + h + 2 * k0, im, UnpackHigh(both, negated), DupLow(both),
-          Join(Make<V>(c_half[-kk0], c_half[kk0]), Make<V>(c_half[-kk], c_half[kk])));
+          mid_down, mid_up, im, UnpackHigh(both, negated), DupLow(both),
+          Join(Make<V>(half_down[0], half_up[0]), Make<V>(half_down[-step], half_up[step])));
+      up += 4;
+      down -= 4;
+      mid_down -= 4;
+      mid_up += 4;
+      c_up += 2 * step;
+      c_down -= 2 * step;
+      half_down -= 2 * step;
+      half_up += 2 * step;
       return;
     }
     const V negated = Neg(w);

@@ -202,11 +202,11 @@ void Apm::SetUpSearch() {
 // Candidates: the on-beat state of every lag (lag index order), then the
 // states whose best predecessor has left the beam.
 void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
-  candidates_.clear();
+  candidates_.resize(lag_count_);
   for (int32_t i = 0; i < lag_count_; ++i) {
     if (t > 0 && ++frame_phase_[i] == lag_frames_[i]) frame_phase_[i] = 0;
-    candidates_.push_back(lag_first_state_[i] + frame_phase_[i]);
-    observation_[candidates_.back()] = comb_out_[i];
+    candidates_[i] = lag_first_state_[i] + frame_phase_[i];
+    observation_[candidates_[i]] = comb_out_[i];
   }
   const double* values = values_.row(cur);
   for (int32_t k = 0; k < active; ++k) {
@@ -323,10 +323,10 @@ void Apm::Transition(int32_t cur, int32_t next, int32_t active) {
     TransitionOneByOne(cur, next, active);
   } else {
     const double* values = values_.row(cur);
+    const double bonus = config_.beat_bonus;
     for (int32_t k = 0; k < active; ++k) {
       const int32_t f = beam_[k];
-      entry_base_[k] =
-          config_.beat_bonus + (values[f] == kUnreached ? 0.0 : values[f]);
+      entry_base_[k] = bonus + (values[f] == kUnreached ? 0.0 : values[f]);
       entry_lag_[k] = state_lag_[f] - min_lag_;
       entry_offset_[k] = Offset(f);
     }

@@ -60,6 +60,26 @@ bool Bounded(const double* v, size_t n, double* max_abs) {
   return true;
 }
 
+// Bounded for the bases of a beam of count >= 1 entries, telling on the
+// way whether they ascend: the beam's usual order, which Keep takes as it
+// is then.
+bool BoundedBases(const double* base, int32_t count, double* max_abs,
+                  bool* ascending) {
+  double largest = 0.0;
+  double previous = base[0];
+  bool up = true;
+  for (int32_t k = 0; k < count; ++k) {
+    const double a = std::abs(base[k]);
+    if (!(a <= kLargest)) return false;
+    largest = std::max(largest, a);
+    up &= previous <= base[k];
+    previous = base[k];
+  }
+  *max_abs = largest;
+  *ascending = up;
+  return true;
+}
+
 // In any order of offers this keeps the first entry with the largest
 // score, as a pass in beam order with a strict comparison does.
 // Without branches: whether an offer wins is hard to predict.
@@ -113,8 +133,9 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
   double base_max = 0.0;
   double observation_max = 0.0;
   double prior_max = 0.0;
+  bool ascending = false;
   if (!usable_ || entries.count < 1 ||
-      !Bounded(entries.base, entries.count, &base_max) ||
+      !BoundedBases(entries.base, entries.count, &base_max, &ascending) ||
       !Bounded(observation, lag_count_, &observation_max) ||
       !Bounded(prior, lag_count_, &prior_max)) {
     return false;
@@ -131,8 +152,7 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
       std::ldexp(bound, -50) + 16 * std::numeric_limits<double>::denorm_min();
   margin_ =
       std::ldexp(bound, -46) + 16 * std::numeric_limits<double>::denorm_min();
-  Order(entries);
-  Keep();
+  Keep(entries, ascending);
   FindLeader();
   std::fill_n(best, lag_count_, -std::numeric_limits<double>::infinity());
   std::fill_n(from, lag_count_, entries.count);
@@ -172,57 +192,69 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
 }
 
 // Entries by descending base. The beam comes out of the selection in
-// ascending order of value, so this is usually a reversal.
-void TransitionScorer::Order(const BeamEntries& entries) {
+// ascending order of value, so this is usually a reversal, taken without
+// an index table.
+void TransitionScorer::Keep(const BeamEntries& entries, bool ascending) {
   const int32_t count = entries.count;
   const double* base = entries.base;
-  order_.resize(count);
-  bool ascending = true;
-  for (int32_t k = 0; k < count; ++k) {
-    order_[k] = count - 1 - k;
-    ascending &= k == 0 || base[k - 1] <= base[k];
-  }
-  if (!ascending) {
+  if (ascending) {
+    KeepInOrder(entries, [count](int32_t i) { return count - 1 - i; });
+  } else {
+    order_.resize(count);
+    for (int32_t k = 0; k < count; ++k) order_[k] = count - 1 - k;
     std::sort(order_.begin(), order_.end(),
               [base](int32_t a, int32_t b) { return base[a] > base[b]; });
+    KeepInOrder(entries, [this](int32_t i) { return order_[i]; });
   }
-  sorted_.resize(count);
-  for (int32_t i = 0; i < count; ++i) {
-    const int32_t e = order_[i];
-    sorted_[i] = {base[e], entries.lag[e], entries.offset[e], e};
-  }
-}
-
-void TransitionScorer::Keep() {
-  seen_.NextGeneration();
-  const int32_t count = static_cast<int32_t>(sorted_.size());
-  if (kept_.size() < sorted_.size()) kept_.resize(sorted_.size());
-  const int32_t class_count = phase_tail_ + 1;
-  class_start_.assign(class_count + 1, 0);
-  int32_t kept = 0;
-  for (int32_t i = 0; i < count; ++i) {
-    const Entry& e = sorted_[i];
-    const bool crowded =
-        (i > 0 && sorted_[i - 1].base - e.base <= delta_) |
-        (i + 1 < count && e.base - sorted_[i + 1].base <= delta_);
-    const int32_t phase_class = std::min(std::abs(e.offset), phase_tail_);
-    const bool first =
-        seen_.Mark(static_cast<size_t>(e.lag) * class_count + phase_class);
-    // Written in any case, counted only when kept: fewer branches.
-    kept_[kept] = {e.base, e.lag, phase_class, e.entry, crowded};
-    class_start_[phase_class + 1] += first | crowded;
-    kept += first | crowded;
-  }
-  kept_count_ = kept;
   // Kept entries by class, keeping their order within a class.
+  const int32_t class_count = phase_tail_ + 1;
   for (int32_t q = 0; q < class_count; ++q) {
     class_start_[q + 1] += class_start_[q];
   }
-  by_class_.resize(kept);
+  by_class_.resize(kept_count_);
   fill_.assign(class_start_.begin(), class_start_.end() - 1);
-  for (int32_t i = 0; i < kept; ++i) {
+  for (int32_t i = 0; i < kept_count_; ++i) {
     by_class_[fill_[kept_[i].phase_class]++] = i;
   }
+}
+
+// Entry index(i) is the i-th by descending base. Members are read into
+// locals first: the stores of the loop could alias them for all the
+// compiler knows.
+template <typename Index>
+void TransitionScorer::KeepInOrder(const BeamEntries& entries, Index index) {
+  seen_.NextGeneration();
+  const GenerationMarks::Marker seen = seen_.Hold();
+  const int32_t count = entries.count;
+  if (kept_.size() < static_cast<size_t>(count)) kept_.resize(count);
+  const int32_t phase_tail = phase_tail_;
+  const int32_t class_count = phase_tail + 1;
+  class_start_.assign(class_count + 1, 0);
+  int32_t* const class_end = class_start_.data() + 1;
+  Kept* const out = kept_.data();
+  const double* const bases = entries.base;
+  const int32_t* const lags = entries.lag;
+  const int32_t* const offsets = entries.offset;
+  const double delta = delta_;
+  int32_t kept = 0;
+  // Whether the entry is within delta of the one before, and of the one
+  // after: the same difference serves both entries of a pair.
+  bool close_before = false;
+  for (int32_t i = 0; i < count; ++i) {
+    const int32_t e = index(i);
+    const double base = bases[e];
+    const bool close_after = i + 1 < count && base - bases[index(i + 1)] <= delta;
+    const bool crowded = close_before | close_after;
+    close_before = close_after;
+    const int32_t lag = lags[e];
+    const int32_t phase_class = std::min(std::abs(offsets[e]), phase_tail);
+    const bool first = seen.Mark(static_cast<size_t>(lag) * class_count + phase_class);
+    // Written in any case, counted only when kept: fewer branches.
+    out[kept] = {base, lag, phase_class, e, crowded};
+    class_end[phase_class] += first | crowded;
+    kept += first | crowded;
+  }
+  kept_count_ = kept;
 }
 
 void TransitionScorer::FindLeader() {

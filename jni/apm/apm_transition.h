@@ -51,12 +51,6 @@ class TransitionScorer {
                   int32_t* from) const;
 
  private:
-  struct Entry {
-    double base;
-    int32_t lag;
-    int32_t offset;
-    int32_t entry;
-  };
   // Beam entries that can win for some lag, largest base first.
   struct Kept {
     double base;
@@ -66,8 +60,9 @@ class TransitionScorer {
     bool crowded;
   };
 
-  void Order(const BeamEntries& entries);
-  void Keep();
+  void Keep(const BeamEntries& entries, bool ascending);
+  template <typename Index>
+  void KeepInOrder(const BeamEntries& entries, Index index);
   void FindLeader();
   void Limit(double key, int32_t* first, int32_t* last) const;
   void ScoreNear(const double* observation, const double* prior, double* best,
@@ -101,9 +96,8 @@ class TransitionScorer {
   double lead_ = 0.0;
   int32_t lead_lag_ = 0;
 
+  // The entries by descending base, where they are not simply reversed.
   std::vector<int32_t> order_;
-  // The entries by descending base.
-  std::vector<Entry> sorted_;
   std::vector<Kept> kept_;
   int32_t kept_count_ = 0;
   // Positions in kept_ by phase class, largest base first within a class;

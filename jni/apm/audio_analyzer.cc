@@ -5,10 +5,10 @@
 #include <algorithm>
 #include <cmath>
 #include <cstdint>
+#include <memory>
 
 #include "base/logging.h"
 #include "jni/apm/analysis_frame_rate.h"
-#include "jni/apm/frame_transform.h"
 #include "jni/apm/tempo_range.h"
 
 namespace apm {
@@ -129,22 +129,22 @@ std::function<bool(float)> AudioAnalyzer::StageProgress(int32_t stage) const {
 
 // The spectrogram and the onset detector run side by side over the blocks
 // of the input, frame by frame, so neither the mono signal nor the
-// spectrogram is ever held whole.
+// spectrogram is ever held whole, nor even one frame of it in float: the
+// detector rounds each bin to float as it reads it from the transform's
+// doubles.
 void AudioAnalyzer::StartSpectrogram(int64_t frame_count) {
   spectrogram_calculator_.Initialize(static_cast<double>(sample_rate_));
   frames_per_second_ = spectrogram_calculator_.frames_per_second();
-  frame_.resize(spectrogram_calculator_.bin_count());
   onset_detector_.Reset(spectrogram_calculator_.bin_count());
   // Progress only: a length past the 32-bit range reports it approximately.
   spectrogram_calculator_.BeginStream(static_cast<int32_t>(std::min<int64_t>(
       std::max<int64_t>(frame_count, 0), INT32_MAX)));
   spectrogram_progress_ = StageProgress(0);
   detect_ = [this](const double* bins) {
-    // The spectrogram hands out the FFT's doubles; the detector takes the
-    // floats a stored frame would hold.
-    BinsToFloats(bins, static_cast<int32_t>(frame_.size()),
-                 reinterpret_cast<float*>(frame_.data()));
-    detection_function_.push_back(onset_detector_.DetectFrame(frame_.data()));
+    // bin_count (re, im) pairs, the count the detector was reset for; the
+    // values are those a stored frame of floats would give, as the
+    // spectrogram's own frames are.
+    detection_function_.push_back(onset_detector_.DetectFrame(bins));
   };
 }
 

@@ -93,7 +93,6 @@ class AudioAnalyzer {
   int64_t frames_fed_ = 0;
   // One block of mono samples at a time: the whole signal is never held.
   std::vector<float> samples_;
-  SpectrogramFrame frame_;
 
   int32_t frames_per_second_ = 0;
   std::vector<float> detection_function_;

@@ -27,14 +27,4 @@ void WindowFrameAvx(const float* samples, const double* window,
   for (; j < fft_length; ++j) buffer[j] = 0.0;
 }
 
-int32_t DoublesToFloatsAvx(const double* values, int32_t count, float* floats) {
-  int32_t i = 0;
-  for (; i + 8 <= count; i += 8) {
-    _mm_storeu_ps(floats + i, _mm256_cvtpd_ps(_mm256_loadu_pd(values + i)));
-    _mm_storeu_ps(floats + i + 4,
-                  _mm256_cvtpd_ps(_mm256_loadu_pd(values + i + 4)));
-  }
-  return i;
-}
-
 }  // namespace apm

@@ -26,14 +26,4 @@ void TransformFrame(const float* samples, const double* window,
   buffer[1] = 0.0;
 }
 
-void BinsToFloats(const double* bins, int32_t bin_count, float* floats) {
-  int32_t i = 0;
-#if defined(__x86_64__)
-  if (instruction_set::HasAvx()) {
-    i = DoublesToFloatsAvx(bins, 2 * bin_count, floats);
-  }
-#endif
-  for (; i < 2 * bin_count; ++i) floats[i] = static_cast<float>(bins[i]);
-}
-
 }  // namespace apm

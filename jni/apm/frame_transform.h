@@ -1,5 +1,5 @@
-// One frame of the spectrogram through the real FFT, and its bins out to
-// float: the AVX kernels where they run, the same bits either way.
+// One frame of the spectrogram through the real FFT: the AVX windowing
+// where it runs, the same bits either way.
 #ifndef CLIPWEAVER_JNI_APM_FRAME_TRANSFORM_H_
 #define CLIPWEAVER_JNI_APM_FRAME_TRANSFORM_H_
 
@@ -14,9 +14,6 @@ namespace apm {
 void TransformFrame(const float* samples, const double* window,
                     int32_t window_length, int32_t fft_length, double* buffer,
                     int* bit_reversal_work, double* twiddle_table);
-
-// floats[i] = the float nearest bins[i] for i < 2 * bin_count.
-void BinsToFloats(const double* bins, int32_t bin_count, float* floats);
 
 }  // namespace apm
 

@@ -26,12 +26,21 @@ class GenerationMarks {
   }
 
   // True when index was not yet marked in this generation; marks it.
-  bool Mark(size_t index) {
-    uint32_t& mark = marks_[index];
-    const bool first = mark != generation_;
-    mark = generation_;
-    return first;
-  }
+  bool Mark(size_t index) { return Marker{marks_.data(), generation_}.Mark(index); }
+
+  // The same for a loop of marks with nothing else changing the set: the
+  // generation stays in a register rather than being read again after
+  // every mark, which might have changed it.
+  struct Marker {
+    uint32_t* marks;
+    uint32_t generation;
+    bool Mark(size_t index) const {
+      const bool first = marks[index] != generation;
+      marks[index] = generation;
+      return first;
+    }
+  };
+  Marker Hold() { return {marks_.data(), generation_}; }
 
  private:
   std::vector<uint32_t> marks_;

@@ -12,11 +12,12 @@ namespace apm {
 inline namespace CLIPWEAVER_ISA {
 
 // One step for bins k .. k + lanes - 1, lanes being 8 for Float8, 4 for
-// Float4 and 1 for float; all compute the same bits.
-template <typename V>
-inline void DetectBins(const float* bins, int32_t k, float* previous_magnitude,
-                       float* u1_re, float* u1_im, float* u2_re, float* u2_im,
-                       float* distance) {
+// Float4 and 1 for float; all compute the same bits. Bins of doubles are
+// taken at the nearest float, as a stored frame holds them. Returns the
+// distances.
+template <typename V, typename T>
+inline V DetectBins(const T* bins, int32_t k, float* previous_magnitude, float* u1_re,
+                    float* u1_im, float* u2_re, float* u2_im) {
   using simd::Load;
   V re, im;
   simd::LoadComplex(bins + 2 * k, &re, &im);
@@ -37,12 +38,12 @@ inline void DetectBins(const float* bins, int32_t k, float* previous_magnitude,
   const V p = Load<V>(previous_magnitude + k);
   const V d_re = p * predicted_re - re;
   const V d_im = p * predicted_im - im;
-  simd::Store(distance + k, simd::Sqrt(d_re * d_re + d_im * d_im));
   simd::Store(previous_magnitude + k, magnitude);
   simd::Store(u2_re + k, p1_re);
   simd::Store(u2_im + k, p1_im);
   simd::Store(u1_re + k, u_re);
   simd::Store(u1_im + k, u_im);
+  return simd::Sqrt(d_re * d_re + d_im * d_im);
 }
 
 }  // namespace CLIPWEAVER_ISA

@@ -15,16 +15,16 @@ namespace {
 constexpr float kStartPhasorRe = -1.0f;
 constexpr float kStartPhasorIm = 8.742278e-8f;
 
-// Sums four lanes side by side, then the lanes pairwise, then the bins that
-// do not fill a lane group, so the result is the same on every vector width.
-float LaneSum(const float* values, int32_t count) {
-  float lane[4] = {0, 0, 0, 0};
-  int32_t k = 0;
+// Sums four lanes side by side, then pairwise, then the rest: equal on every width.
+template <typename T>
+float DetectRest(const T* x, int32_t k, int32_t count, float* const* s, simd::Float4 lanes) {
   for (; k + 4 <= count; k += 4) {
-    for (int j = 0; j < 4; ++j) lane[j] += values[k + j];
+    lanes = lanes + DetectBins<simd::Float4>(x, k, s[0], s[1], s[2], s[3], s[4]);
   }
+  float lane[4];
+  simd::Store(lane, lanes);
   float sum = (lane[0] + lane[1]) + (lane[2] + lane[3]);
-  for (; k < count; ++k) sum += values[k];
+  for (; k < count; ++k) sum += DetectBins<float>(x, k, s[0], s[1], s[2], s[3], s[4]);
   return sum;
 }
 
@@ -72,33 +72,28 @@ void OnsetDetector::Reset(int32_t bin_count) {
   previous_phasors_im_.assign(bin_count, kStartPhasorIm);
   second_previous_phasors_re_.assign(bin_count, kStartPhasorRe);
   second_previous_phasors_im_.assign(bin_count, kStartPhasorIm);
-  distances_.resize(bin_count);
 }
 
 float OnsetDetector::DetectFrame(const std::complex<float>* bins) {
-  const float* x = reinterpret_cast<const float*>(bins);
-  float* state[] = {previous_magnitudes_.data(),
-                    previous_phasors_re_.data(),
-                    previous_phasors_im_.data(),
-                    second_previous_phasors_re_.data(),
-                    second_previous_phasors_im_.data(),
-                    distances_.data()};
+  return Detect(reinterpret_cast<const float*>(bins));
+}
+
+float OnsetDetector::DetectFrame(const double* bins) { return Detect(bins); }
+
+template <typename T>
+float OnsetDetector::Detect(const T* x) {
+  float* state[] = {previous_magnitudes_.data(), previous_phasors_re_.data(),
+                    previous_phasors_im_.data(), second_previous_phasors_re_.data(),
+                    second_previous_phasors_im_.data()};
+  // The eight-lane kernel leaves its partial sums four lanes wide.
+  float lane[4] = {0, 0, 0, 0};
   int32_t k = 0;
 #if defined(__x86_64__)
   if (instruction_set::HasAvx()) {
-    k = DetectBinsAvx(x, bin_count_, state[0], state[1], state[2], state[3],
-                      state[4], state[5]);
+    k = DetectBinsAvx(x, bin_count_, state[0], state[1], state[2], state[3], state[4], lane);
   }
 #endif
-  for (; k + 4 <= bin_count_; k += 4) {
-    DetectBins<simd::Float4>(x, k, state[0], state[1], state[2], state[3],
-                             state[4], state[5]);
-  }
-  for (; k < bin_count_; ++k) {
-    DetectBins<float>(x, k, state[0], state[1], state[2], state[3], state[4],
-                      state[5]);
-  }
-  return LaneSum(distances_.data(), bin_count_);
+  return DetectRest(x, k, bin_count_, state, simd::Load<simd::Float4>(lane));
 }
 
 }  // namespace apm

@@ -32,6 +32,8 @@ class OnsetDetector {
   // DetectFrame per frame in time order.
   void Reset(int32_t bin_count);
   float DetectFrame(const std::complex<float>* bins);
+  // The same for bins of doubles, (re, im) pairs, taken at the nearest float.
+  float DetectFrame(const double* bins);
 
   // For a pass whose values DetectFrame already produced: the report and the
   // progress calls that ComputeDetectionFunction makes over `frame_count`
@@ -40,6 +42,8 @@ class OnsetDetector {
 
  private:
   static bool EmptyInput();
+  template <typename T>
+  float Detect(const T* bins);
 
   int32_t bin_count_ = 0;
   // Frame t - 1: magnitudes and unit phasors; frame t - 2: unit phasors.
@@ -48,8 +52,6 @@ class OnsetDetector {
   std::vector<float> previous_phasors_im_;
   std::vector<float> second_previous_phasors_re_;
   std::vector<float> second_previous_phasors_im_;
-  // Per-frame scratch, sized with the state.
-  std::vector<float> distances_;
 };
 
 }  // namespace apm

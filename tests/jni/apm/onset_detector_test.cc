@@ -43,6 +43,36 @@ TEST(OnsetDetector, EveryLaneWidthGivesTheSameBits) {
   }
 }
 
+// Bins handed over as doubles must give the bits of the frames of floats
+// they round to, on every lane width; the halfway cases round to even.
+TEST(OnsetDetector, DoubleBinsReadAsTheirNearestFloats) {
+  constexpr int kBins = 13;
+  const double tie = std::ldexp(1.0, -24);
+  std::vector<std::vector<double>> doubles;
+  std::vector<SpectrogramFrame> floats;
+  for (int t = 0; t < 3; ++t) {
+    std::vector<double> frame;
+    for (int k = 0; k < 2 * kBins; ++k) {
+      const double base = (k % 3 == 0) ? 1.0 + (k % 2 ? 3 : 1) * tie
+                                       : std::sin(0.37 * (k + 1) + 1.3 * t) * (300.0 + k);
+      frame.push_back(k % 5 == 4 ? -base : base);
+    }
+    floats.emplace_back();
+    for (int k = 0; k < kBins; ++k) {
+      floats.back().emplace_back(static_cast<float>(frame[2 * k]),
+                                 static_cast<float>(frame[2 * k + 1]));
+    }
+    doubles.push_back(frame);
+  }
+  OnsetDetector from_doubles, from_floats;
+  from_doubles.Reset(kBins);
+  from_floats.Reset(kBins);
+  for (int t = 0; t < 3; ++t) {
+    EXPECT_EQ(from_doubles.DetectFrame(doubles[t].data()),
+              from_floats.DetectFrame(floats[t].data())) << t;
+  }
+}
+
 // An empty spectrogram is an error; a cancelled run keeps what it made.
 TEST(OnsetDetector, ProgressCancellationAppendingAndEmptyInput) {
   const std::vector<SpectrogramFrame> spectrogram(250, SpectrogramFrame(4, {1, 2}));
