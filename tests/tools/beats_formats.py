@@ -3,7 +3,7 @@ formats."""
 import statistics
 import unittest
 
-from tool_harness import beats_json, example, main, run
+from tool_harness import beats_json, example, run
 
 
 class InputAndOutputFormats(unittest.TestCase):
@@ -11,7 +11,6 @@ class InputAndOutputFormats(unittest.TestCase):
     # gives 99.77, so tempos there read up to 0.8% low; 110 BPM falls on a
     # whole number of frames and stays clear of the 1% margin.
     CASES = [
-        ('w44.wav', 120, 44100, 2),
         ('f48.flac', 100, 48000, 1),
         ('w22.wav', 110, 22050, 2),
         ('o44.ogg', 90, 44100, 2),
@@ -47,7 +46,3 @@ class InputAndOutputFormats(unittest.TestCase):
         for times in ([float(t) for line in text[1:] for t in line.split()],
                       [float(row.split(',')[3]) for row in rows[1:]]):
             self.assertEqual(times, [round(b, 3) for b in result['beats']])
-
-
-if __name__ == '__main__':
-    main()

@@ -3,22 +3,34 @@ leaves every file as it was, memory stays bounded whatever the ratio, and
 what a file's header hides or its name holds is told plainly."""
 import os
 import signal
+import subprocess
 import time
 import unittest
 
-from tool_harness import example, main, path, read_wav, run, silent_wav, snapshot, start
+import tool_harness
+from tool_harness import example, path, read_wav, run, silent_wav, snapshot
 
 
-def wait_for_partial(prefix, size):
-    """The hidden temporary file of an output in the works, once it holds
-    at least size bytes."""
-    deadline = time.monotonic() + 30
-    while time.monotonic() < deadline:
-        for name in os.listdir(path('.')):
-            if name.startswith('.' + prefix) and os.path.getsize(path(name)) >= size:
-                return path(name)
-        time.sleep(0.01)
-    raise AssertionError(f'no temporary file for {prefix}')
+def start(*args):
+    return subprocess.Popen([tool_harness.TOOL, *map(str, args)], stdout=subprocess.PIPE,
+                            stderr=subprocess.PIPE, text=True, cwd=tool_harness.WORK,
+                            preexec_fn=tool_harness.limits())
+
+
+def partial(prefix, header):
+    """Waits until the hidden temporary file of an output in the works holds
+    its first bytes, and checks them."""
+    def ready(process):
+        deadline = time.monotonic() + 30
+        while time.monotonic() < deadline:
+            for name in os.listdir(path('.')):
+                if name.startswith('.' + prefix) and os.path.getsize(path(name)) >= 4:
+                    with open(path(name), 'rb') as f:
+                        assert f.read(4) == header, prefix
+                    return
+            time.sleep(0.01)
+        raise AssertionError(f'no temporary file for {prefix}')
+    return ready
 
 
 class DataSafety(unittest.TestCase):
@@ -40,12 +52,6 @@ class DataSafety(unittest.TestCase):
         self.assertEqual((channels, rate, len(samples)), (1, 768000, 5 * 768000))
 
     def test_ctrl_c_in_any_phase_leaves_nothing_and_says_what_stopped(self):
-        def partial(name, header):
-            def ready(process):
-                with open(wait_for_partial(name, 4), 'rb') as f:
-                    self.assertEqual(f.read(4), header)
-            return ready
-
         def first_result(process):
             self.assertIn('a.wav: 120.00 BPM', process.stdout.readline())
 
@@ -112,7 +118,3 @@ class DataSafety(unittest.TestCase):
         self.assertTrue(done.stdout.startswith(
             'x\\ny\\x1B[31m\\xC2\\x9B.wav: 120.00 BPM'), done.stdout)
         self.assertEqual(done.stderr, 'clipweaver: gone\\r.wav: no such file\n')
-
-
-if __name__ == '__main__':
-    main()

@@ -6,7 +6,7 @@ import subprocess
 import unittest
 
 import tool_harness
-from tool_harness import example, main, run
+from tool_harness import example, run
 
 
 class HelpAndVersion(unittest.TestCase):
@@ -64,7 +64,3 @@ class ProgressBar(unittest.TestCase):
         # Two rows are redrawn together: the cursor goes up two lines.
         self.assertIn('\x1b[2A', shown)
         self.assertNotIn('\x1b[3A', shown)
-
-
-if __name__ == '__main__':
-    main()

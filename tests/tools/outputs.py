@@ -5,7 +5,7 @@ import re
 import unittest
 import xml.etree.ElementTree as ElementTree
 
-from tool_harness import beats_json, example, main, path, read_wav, run
+from tool_harness import beats_json, example, path, read_wav, run
 
 SVG = '{http://www.w3.org/2000/svg}'
 
@@ -79,7 +79,3 @@ class ClickTrackAndPlot(unittest.TestCase):
             with open(path(f'plots/{name}.html'), encoding='utf-8') as page:
                 data = re.search(r'id="clipweaver-data">(.*?)</script>', page.read()).group(1)
                 self.assertEqual(json.loads(data)['file'], source)
-
-
-if __name__ == '__main__':
-    main()

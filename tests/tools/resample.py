@@ -2,7 +2,7 @@
 across the block boundaries of its streaming loop."""
 import unittest
 
-from tool_harness import example, main, read_wav, run
+from tool_harness import example, read_wav, run
 
 
 def resample(source, target, *options):
@@ -37,6 +37,3 @@ class Resample(unittest.TestCase):
         _, _, music = read_wav(self.mono)
         _, _, out = resample(self.mono, 'third.wav', '--rate', 16000)
         self.assertEqual(out, [0] + music[2::3][:3 * 16000 - 1])
-
-if __name__ == '__main__':
-    main()

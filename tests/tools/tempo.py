@@ -2,7 +2,7 @@
 frame rate."""
 import unittest
 
-from tool_harness import beats_json, example, main
+from tool_harness import beats_json, example
 
 
 class TempoRange(unittest.TestCase):
@@ -42,7 +42,3 @@ class TrueFrameRate(unittest.TestCase):
                 self.assertLessEqual(abs(sum(off_grid) / len(beats)), frame)
                 self.assertLess(beats[-1], seconds)
                 self.assertAlmostEqual(result['tempo'], 120, delta=0.06)
-
-
-if __name__ == '__main__':
-    main()

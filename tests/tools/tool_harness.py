@@ -1,6 +1,5 @@
-"""Shared helpers of the clipweaver end-to-end suites.
-
-Each suite runs as: python3 SUITE.py PATH/TO/clipweaver WORK_DIR
+"""Shared helpers of the clipweaver end-to-end suites, and their runner:
+python3 tool_harness.py SUITE PATH/TO/clipweaver WORK_DIR [unittest arguments]
 """
 import array
 import hashlib
@@ -16,14 +15,6 @@ import wave
 
 TOOL = None
 WORK = None
-
-
-def main():
-    global TOOL, WORK
-    TOOL, WORK = sys.argv[1], sys.argv[2]
-    shutil.rmtree(WORK, ignore_errors=True)
-    os.makedirs(WORK)
-    unittest.main(argv=sys.argv[:1] + sys.argv[3:], verbosity=2)
 
 
 def path(name):
@@ -48,13 +39,6 @@ def run(*args, timeout=300, memory=MEMORY_LIMIT, file_size=None):
     return subprocess.run([TOOL, *map(str, args)], capture_output=True,
                           text=True, timeout=timeout, cwd=WORK,
                           preexec_fn=limits(memory, file_size))
-
-
-def start(*args):
-    """The tool running in the background, for tests that interrupt it."""
-    return subprocess.Popen([TOOL, *map(str, args)], stdout=subprocess.PIPE,
-                            stderr=subprocess.PIPE, text=True, cwd=WORK,
-                            preexec_fn=limits())
 
 
 def example(name, bpm=120, rate=44100, channels=2, seconds=20):
@@ -100,3 +84,12 @@ def read_wav(name):
         assert w.getsampwidth() == 2
         samples = array.array('h', w.readframes(w.getnframes()))
         return w.getnchannels(), w.getframerate(), samples.tolist()
+
+
+if __name__ == '__main__':
+    # The suites import this file as tool_harness, not as __main__.
+    import tool_harness
+    suite, tool_harness.TOOL, tool_harness.WORK = sys.argv[1:4]
+    shutil.rmtree(tool_harness.WORK, ignore_errors=True)
+    os.makedirs(tool_harness.WORK)
+    unittest.main(module=suite, argv=[suite] + sys.argv[4:], verbosity=2)
