@@ -44,7 +44,7 @@ def run_on_terminal(*args):
 
 
 class ProgressBar(unittest.TestCase):
-    def test_drawn_on_a_terminal_up_to_100_percent_and_erased_unless_quiet_or_verbose(self):
+    def test_drawn_up_to_100_percent_one_row_per_worker_erased_unless_quiet_or_verbose(self):
         groove = example('groove.wav')
         shown, status = run_on_terminal('beats', groove)
         self.assertEqual(status, 0)
@@ -56,11 +56,8 @@ class ProgressBar(unittest.TestCase):
         shown, _ = run_on_terminal('beats', '--verbose', groove)
         self.assertNotIn('%', shown)
         self.assertIn('native : ', shown)
-
-    def test_one_row_per_worker(self):
-        files = [example('groove.wav'), example('other.wav', 100)] * 2
-        shown, status = run_on_terminal('beats', '-j2', *files)
+        # One row per worker, redrawn together: the cursor goes up two lines.
+        shown, status = run_on_terminal('beats', '-j2', *[groove, example('other.wav', 100)] * 2)
         self.assertEqual(status, 0)
-        # Two rows are redrawn together: the cursor goes up two lines.
         self.assertIn('\x1b[2A', shown)
         self.assertNotIn('\x1b[3A', shown)

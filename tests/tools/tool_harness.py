@@ -52,7 +52,6 @@ def example(name, bpm=120, rate=44100, channels=2, seconds=20):
 
 
 def snapshot():
-    """Every file under the work directory with its digest."""
     files = {}
     for root, _, names in os.walk(WORK):
         for name in names:
