@@ -1,7 +1,4 @@
-"""The beat viewer page in Chromium, driven through Selenium.
-
-Screenshots of the pages are left in the work directory.
-"""
+"""The viewer page in Chromium through Selenium; screenshots are left in the work directory."""
 import json
 import math
 import os
@@ -90,14 +87,16 @@ class Pages(unittest.TestCase):
                 with open(html, encoding='utf-8') as page:
                     self.assertNotIn('://', page.read())  # nothing fetched from anywhere
                 open_page(html)
-                data = json.loads(js('return document.getElementById("clipweaver-data").textContent'))
+                data = json.loads(
+                    js('return document.getElementById("clipweaver-data").textContent'))
                 self.assertEqual(DRIVER.find_element(By.ID, 'file').text, report['file'])
                 self.assertEqual(DRIVER.title, report['file'] + ' \N{EM DASH} beats')
                 self.assertEqual({key: data[key] for key in report}, report)
                 # Both views have drawn something.
                 for canvas in ('overview', 'detail'):
                     inked = js('const c = document.getElementById(arguments[0]);'
-                               'const d = c.getContext("2d").getImageData(0, 0, c.width, c.height).data;'
+                               'const d = c.getContext("2d")'
+                               '.getImageData(0, 0, c.width, c.height).data;'
                                'let n = 0; for (let i = 3; i < d.length; i += 4) n += d[i] > 0;'
                                'return n / (c.width * c.height);', canvas)
                     self.assertGreater(inked, ink, canvas)
@@ -153,7 +152,8 @@ class Controls(unittest.TestCase):
     def test_a_click_seeks_and_a_drag_pans(self):
         width = self.detail.size['width']
         # Offsets count from the middle of the element.
-        ActionChains(DRIVER).move_to_element_with_offset(self.detail, width // 4, 0).click().perform()
+        ActionChains(DRIVER).move_to_element_with_offset(self.detail, width // 4, 0) \
+            .click().perform()
         self.assertAlmostEqual(audio_time(), 7.5, delta=10 / width * 2)
         self.assertEqual(visible_range(), (0, 10))
         ActionChains(DRIVER).move_to_element(self.detail).click_and_hold() \

@@ -37,7 +37,8 @@ class ClickTrackAndPlot(unittest.TestCase):
                               for t in row.findall(f"{SVG}g[@class='axis']/{SVG}text")]
                     (x0, t0), (x1, t1) = labels[0], labels[-1]
                     self.assertEqual(t0, 10 * index)
-                    xs = [float(m.get('x1')) for m in row.findall(f"{SVG}g[@class='beats']/{SVG}line")]
+                    xs = [float(m.get('x1'))
+                          for m in row.findall(f"{SVG}g[@class='beats']/{SVG}line")]
                     # Distinct marks: several pixels between neighbours.
                     self.assertTrue(all(b - a > 20 for a, b in zip(xs, xs[1:])), xs)
                     found += [t0 + (x - x0) * (t1 - t0) / (x1 - x0) for x in xs]

@@ -18,7 +18,6 @@ class Resample(unittest.TestCase):
         cls.mono = example('mono.wav', 120, 48000, 1, seconds=3)
 
     def test_frame_counts_and_samples_across_blocks(self):
-        # 3 s at the source rate make 3 s at the target rate.
         for source, rate, channels in [(self.stereo, 48000, 2), (self.stereo, 22050, 2),
                                        (self.mono, 44100, 1)]:
             with self.subTest(source=source, rate=rate):

@@ -1,5 +1,4 @@
-"""The tempo the tool reports, --tempo MIN-MAX, and beat times at the true
-frame rate."""
+"""The tempo the tool reports, --tempo MIN-MAX, and beat times at the true frame rate."""
 import unittest
 
 from tool_harness import beats_json, example

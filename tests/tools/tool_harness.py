@@ -79,7 +79,7 @@ def beats_json(*args):
 
 def read_wav(name):
     """(channels, rate, interleaved 16-bit samples) of a PCM WAV file."""
-    with wave.open(path(name) if not os.path.isabs(name) else name) as w:
+    with wave.open(path(name)) as w:  # an absolute name stays as it is
         assert w.getsampwidth() == 2
         samples = array.array('h', w.readframes(w.getnframes()))
         return w.getnchannels(), w.getframerate(), samples.tolist()
