@@ -5,7 +5,7 @@ import json
 import os
 import unittest
 
-from tool_harness import example, main, path, run, silent_wav, snapshot
+from tool_harness import example, path, run, silent_wav, snapshot
 
 
 class Refusals(unittest.TestCase):
@@ -143,7 +143,3 @@ class Refusals(unittest.TestCase):
         self.assertEqual((results[5]['tempo'], results[5]['beats']), (None, []))
         self.assertEqual(results[0], {'file': 'missing.wav', 'error': 'no such file'})
         self.assertEqual(len(done.stderr.splitlines()), len(bad))
-
-
-if __name__ == '__main__':
-    main()

@@ -1,8 +1,6 @@
-"""The beat viewer page in Chromium, driven through Selenium.
-
-Screenshots of the pages are left in the work directory.
-"""
+"""The viewer page in Chromium through Selenium; screenshots are left in the work directory."""
 import json
+import math
 import os
 import unittest
 
@@ -14,7 +12,7 @@ from selenium.webdriver.common.by import By
 from selenium.webdriver.common.keys import Keys
 from selenium.webdriver.support.wait import WebDriverWait
 
-from tool_harness import beats_json, example, main, path, run, silent_wav
+from tool_harness import beats_json, example, path, run, silent_wav
 
 FLAGS = ('--headless', '--no-sandbox', '--disable-gpu', '--disable-quic', '--no-first-run',
          '--disable-background-networking', '--disable-component-update', '--disable-sync',
@@ -89,14 +87,16 @@ class Pages(unittest.TestCase):
                 with open(html, encoding='utf-8') as page:
                     self.assertNotIn('://', page.read())  # nothing fetched from anywhere
                 open_page(html)
-                data = json.loads(js('return document.getElementById("clipweaver-data").textContent'))
+                data = json.loads(
+                    js('return document.getElementById("clipweaver-data").textContent'))
                 self.assertEqual(DRIVER.find_element(By.ID, 'file').text, report['file'])
                 self.assertEqual(DRIVER.title, report['file'] + ' \N{EM DASH} beats')
                 self.assertEqual({key: data[key] for key in report}, report)
                 # Both views have drawn something.
                 for canvas in ('overview', 'detail'):
                     inked = js('const c = document.getElementById(arguments[0]);'
-                               'const d = c.getContext("2d").getImageData(0, 0, c.width, c.height).data;'
+                               'const d = c.getContext("2d")'
+                               '.getImageData(0, 0, c.width, c.height).data;'
                                'let n = 0; for (let i = 3; i < d.length; i += 4) n += d[i] > 0;'
                                'return n / (c.width * c.height);', canvas)
                     self.assertGreater(inked, ink, canvas)
@@ -128,31 +128,32 @@ class Controls(unittest.TestCase):
 
     def test_zoom_and_pan_move_the_visible_range(self):
         # Zooming keeps the middle (or the point under the wheel) in place;
-        # from the start, zooming out and panning left stop at 0.
+        # from the start, zooming out and panning left stop at 0. A wheel
+        # step of 300 zooms by exp(-0.6).
+        wheel = 5 * math.exp(-0.6)
         for control, expected in (('zoom-in', (5 - 10 / 3, 5 + 10 / 3)),
                                   ('+', (5 - 10 / 3, 5 + 10 / 3)),
                                   ('zoom-out', (0, 15)), ('-', (0, 15)),
+                                  ('wheel', (5 - wheel, 5 + wheel)),
                                   (Keys.ARROW_RIGHT, (2, 12)), (Keys.ARROW_LEFT, (0, 10))):
             with self.subTest(repr(control)):
                 open_page(self.html)
                 if control.startswith('zoom'):
                     DRIVER.find_element(By.ID, control).click()
+                elif control == 'wheel':
+                    ActionChains(DRIVER).scroll_from_origin(ScrollOrigin.from_element(
+                        DRIVER.find_element(By.ID, 'detail')), 0, -300).perform()
                 else:
                     ActionChains(DRIVER).send_keys(control).perform()
+                # The wheel is at the middle pixel, not the middle time.
                 for got, want in zip(visible_range(), expected):
-                    self.assertAlmostEqual(got, want, delta=0.002)
-
-        open_page(self.html)
-        detail = DRIVER.find_element(By.ID, 'detail')
-        ActionChains(DRIVER).scroll_from_origin(ScrollOrigin.from_element(detail), 0, -300).perform()
-        start, end = visible_range()
-        self.assertLess(end - start, 9)
-        self.assertAlmostEqual((start + end) / 2, 5, delta=0.1)  # the wheel was at the middle
+                    self.assertAlmostEqual(got, want, delta=0.005)
 
     def test_a_click_seeks_and_a_drag_pans(self):
         width = self.detail.size['width']
         # Offsets count from the middle of the element.
-        ActionChains(DRIVER).move_to_element_with_offset(self.detail, width // 4, 0).click().perform()
+        ActionChains(DRIVER).move_to_element_with_offset(self.detail, width // 4, 0) \
+            .click().perform()
         self.assertAlmostEqual(audio_time(), 7.5, delta=10 / width * 2)
         self.assertEqual(visible_range(), (0, 10))
         ActionChains(DRIVER).move_to_element(self.detail).click_and_hold() \
@@ -162,23 +163,20 @@ class Controls(unittest.TestCase):
         self.assertAlmostEqual(end - start, 10, delta=0.001)
         self.assertAlmostEqual(audio_time(), 7.5, delta=10 / width * 2)
 
-    def test_the_view_turns_the_page_when_the_cursor_runs_off_it(self):
+    def test_the_click_toggle_queues_each_beat_once_and_the_view_follows_the_cursor(self):
+        beats = self.report['beats']
         width = self.detail.size['width']
         ActionChains(DRIVER).move_to_element_with_offset(self.detail, width * 45 // 100, 0) \
             .click().perform()
-        play_until(10.5)
-        start, end = visible_range()
-        self.assertGreater(start, 9)
-        self.assertLess(start, audio_time())
-        self.assertAlmostEqual(end - start, 10, delta=0.001)
-
-    def test_the_click_toggle_queues_each_beat_once_just_ahead_of_the_cursor(self):
-        beats = self.report['beats']
-        ActionChains(DRIVER).move_to_element(self.detail).click().perform()
         seeked = audio_time()
         DRIVER.find_element(By.ID, 'clicks').click()
         play_until(seeked + 3)
         stopped = audio_time()
+        # The cursor ran off the page at 10 s and the view turned.
+        start, end = visible_range()
+        self.assertGreater(start, 9)
+        self.assertLess(start, stopped)
+        self.assertAlmostEqual(end - start, 10, delta=0.001)
         queued = js('return window.clipweaver.scheduledClicks')
         played = [b for b in beats if seeked <= b < stopped]
         self.assertGreater(len(played), 4)
@@ -191,7 +189,3 @@ class Controls(unittest.TestCase):
         for q in queued:
             self.assertGreaterEqual(q['beat'], q['cursor'])
             self.assertLess(q['beat'] - q['cursor'], 0.31)
-
-
-if __name__ == '__main__':
-    main()

@@ -1,4 +1,5 @@
 """What a person at a terminal sees: help, version and the progress bar."""
+import filecmp
 import os
 import pty
 import re
@@ -6,25 +7,7 @@ import subprocess
 import unittest
 
 import tool_harness
-from tool_harness import example, main, run
-
-
-class HelpAndVersion(unittest.TestCase):
-    def test_help_lists_every_option_with_examples_and_version_is_one_line(self):
-        for args in (('--help',), ('beats', '--help'), ('example', '-h')):
-            with self.subTest(args):
-                done = run(*args)
-                self.assertEqual(done.returncode, 0)
-                for option in ('format jobs quiet verbose tempo click plot html rate gain bpm '
-                               'seconds channels version').split():
-                    self.assertIn('--' + option, done.stdout)
-                self.assertIn('\nExamples:\n  clipweaver ', done.stdout)
-        self.assertRegex(run('--version').stdout, r'^clipweaver \d+\.\d+\.\d+\n$')
-
-    def test_example_is_the_same_every_time(self):
-        first, second = example('one.wav', seconds=2), example('two.wav', seconds=2)
-        with open(first, 'rb') as a, open(second, 'rb') as b:
-            self.assertEqual(a.read(), b.read())
+from tool_harness import example, run
 
 
 def run_on_terminal(*args):
@@ -43,8 +26,23 @@ def run_on_terminal(*args):
     return received.decode(), process.wait()
 
 
-class ProgressBar(unittest.TestCase):
-    def test_drawn_on_a_terminal_up_to_100_percent_and_erased_unless_quiet_or_verbose(self):
+class Terminal(unittest.TestCase):
+    def test_help_lists_every_option_with_examples_and_version_is_one_line(self):
+        for args in (('--help',), ('beats', '--help'), ('example', '-h')):
+            with self.subTest(args):
+                done = run(*args)
+                self.assertEqual(done.returncode, 0)
+                for option in ('format jobs quiet verbose tempo click plot html rate gain bpm '
+                               'seconds channels version').split():
+                    self.assertIn('--' + option, done.stdout)
+                self.assertIn('\nExamples:\n  clipweaver ', done.stdout)
+        self.assertRegex(run('--version').stdout, r'^clipweaver \d+\.\d+\.\d+\n$')
+
+    def test_example_is_the_same_every_time(self):
+        self.assertTrue(filecmp.cmp(example('one.wav', seconds=2), example('two.wav', seconds=2),
+                                    shallow=False))
+
+    def test_drawn_up_to_100_percent_one_row_per_worker_erased_unless_quiet_or_verbose(self):
         groove = example('groove.wav')
         shown, status = run_on_terminal('beats', groove)
         self.assertEqual(status, 0)
@@ -56,15 +54,8 @@ class ProgressBar(unittest.TestCase):
         shown, _ = run_on_terminal('beats', '--verbose', groove)
         self.assertNotIn('%', shown)
         self.assertIn('native : ', shown)
-
-    def test_one_row_per_worker(self):
-        files = [example('groove.wav'), example('other.wav', 100)] * 2
-        shown, status = run_on_terminal('beats', '-j2', *files)
+        # One row per worker, redrawn together: the cursor goes up two lines.
+        shown, status = run_on_terminal('beats', '-j2', *[groove, example('other.wav', 100)] * 2)
         self.assertEqual(status, 0)
-        # Two rows are redrawn together: the cursor goes up two lines.
         self.assertIn('\x1b[2A', shown)
         self.assertNotIn('\x1b[3A', shown)
-
-
-if __name__ == '__main__':
-    main()

@@ -5,7 +5,7 @@ import re
 import unittest
 import xml.etree.ElementTree as ElementTree
 
-from tool_harness import beats_json, example, main, path, read_wav, run
+from tool_harness import beats_json, example, path, read_wav
 
 SVG = '{http://www.w3.org/2000/svg}'
 
@@ -13,8 +13,10 @@ SVG = '{http://www.w3.org/2000/svg}'
 class ClickTrackAndPlot(unittest.TestCase):
     @classmethod
     def setUpClass(cls):
-        cls.groove = example('groove.wav')
-        [cls.result] = beats_json(cls.groove, '--click', 'clicks.wav', '--plot', 'groove.svg')
+        cls.groove, cls.other = example('groove.wav'), example('other.flac', 100, 48000, 1)
+        os.makedirs(path('plots'))
+        [cls.result, _] = beats_json(cls.groove, cls.other, '--click', '{}.click.wav',
+                                     '--plot', '{}.svg', '--html', 'plots/{}.html')
 
     def test_plot_shows_every_beat_in_its_row_of_ten_seconds(self):
         [fast] = beats_json(example('fast.wav', 150, seconds=25), '--plot', 'fast.svg')
@@ -35,7 +37,8 @@ class ClickTrackAndPlot(unittest.TestCase):
                               for t in row.findall(f"{SVG}g[@class='axis']/{SVG}text")]
                     (x0, t0), (x1, t1) = labels[0], labels[-1]
                     self.assertEqual(t0, 10 * index)
-                    xs = [float(m.get('x1')) for m in row.findall(f"{SVG}g[@class='beats']/{SVG}line")]
+                    xs = [float(m.get('x1'))
+                          for m in row.findall(f"{SVG}g[@class='beats']/{SVG}line")]
                     # Distinct marks: several pixels between neighbours.
                     self.assertTrue(all(b - a > 20 for a, b in zip(xs, xs[1:])), xs)
                     found += [t0 + (x - x0) * (t1 - t0) / (x1 - x0) for x in xs]
@@ -47,7 +50,7 @@ class ClickTrackAndPlot(unittest.TestCase):
 
     def test_click_track_is_the_music_with_a_burst_at_each_beat(self):
         channels, rate, music = read_wav(self.groove)
-        click_channels, click_rate, clicks = read_wav('clicks.wav')
+        click_channels, click_rate, clicks = read_wav('groove.click.wav')
         self.assertEqual((click_channels, click_rate, len(clicks)),
                          (channels, rate, len(music)))
         starts = {round(b * rate) for b in self.result['beats']}
@@ -69,17 +72,8 @@ class ClickTrackAndPlot(unittest.TestCase):
                 self.assertLessEqual(deviation(frame), 1.0)
 
     def test_several_files_fill_in_the_name_pattern(self):
-        other = example('other.flac', 100, 48000, 1)
-        os.makedirs(path('plots'), exist_ok=True)
-        done = run('beats', '-q', self.groove, other, '--plot', 'plots/{}.svg',
-                   '--html', 'plots/{}.html')
-        self.assertEqual(done.returncode, 0, done.stderr)
-        for name, source in (('groove', self.groove), ('other', other)):
-            ElementTree.parse(path(f'plots/{name}.svg'))
+        for name, source in (('groove', self.groove), ('other', self.other)):
+            ElementTree.parse(path(f'{name}.svg'))
             with open(path(f'plots/{name}.html'), encoding='utf-8') as page:
                 data = re.search(r'id="clipweaver-data">(.*?)</script>', page.read()).group(1)
                 self.assertEqual(json.loads(data)['file'], source)
-
-
-if __name__ == '__main__':
-    main()

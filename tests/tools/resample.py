@@ -2,7 +2,7 @@
 across the block boundaries of its streaming loop."""
 import unittest
 
-from tool_harness import example, main, read_wav, run
+from tool_harness import example, read_wav, run
 
 
 def resample(source, target, *options):
@@ -18,7 +18,6 @@ class Resample(unittest.TestCase):
         cls.mono = example('mono.wav', 120, 48000, 1, seconds=3)
 
     def test_frame_counts_and_samples_across_blocks(self):
-        # 3 s at the source rate make 3 s at the target rate.
         for source, rate, channels in [(self.stereo, 48000, 2), (self.stereo, 22050, 2),
                                        (self.mono, 44100, 1)]:
             with self.subTest(source=source, rate=rate):
@@ -37,6 +36,3 @@ class Resample(unittest.TestCase):
         _, _, music = read_wav(self.mono)
         _, _, out = resample(self.mono, 'third.wav', '--rate', 16000)
         self.assertEqual(out, [0] + music[2::3][:3 * 16000 - 1])
-
-if __name__ == '__main__':
-    main()

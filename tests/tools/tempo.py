@@ -1,11 +1,10 @@
-"""The tempo the tool reports, --tempo MIN-MAX, and beat times at the true
-frame rate."""
+"""The tempo the tool reports, --tempo MIN-MAX, and beat times at the true frame rate."""
 import unittest
 
-from tool_harness import beats_json, example, main
+from tool_harness import beats_json, example
 
 
-class TempoRange(unittest.TestCase):
+class Tempo(unittest.TestCase):
     def test_a_range_moves_the_tracker_to_the_true_metrical_level(self):
         # (groove BPM, what the default finds, arguments with the range)
         for bpm, default, args in [
@@ -22,8 +21,6 @@ class TempoRange(unittest.TestCase):
                 self.assertAlmostEqual(ranged['tracker_tempo'],
                                        6000 / round(6000 / bpm), places=3)
 
-
-class TrueFrameRate(unittest.TestCase):
     def test_beats_lie_on_the_true_grid_at_rates_the_step_does_not_divide(self):
         # (rate, seconds): 221 and 110 samples a step, 99.77 and 100.23 frames
         # a second, counted as 99 and 100 by the library.
@@ -42,7 +39,3 @@ class TrueFrameRate(unittest.TestCase):
                 self.assertLessEqual(abs(sum(off_grid) / len(beats)), frame)
                 self.assertLess(beats[-1], seconds)
                 self.assertAlmostEqual(result['tempo'], 120, delta=0.06)
-
-
-if __name__ == '__main__':
-    main()

@@ -1,6 +1,5 @@
-"""Shared helpers of the clipweaver end-to-end suites.
-
-Each suite runs as: python3 SUITE.py PATH/TO/clipweaver WORK_DIR
+"""Shared helpers of the clipweaver end-to-end suites, and their runner:
+python3 tool_harness.py SUITE PATH/TO/clipweaver WORK_DIR [unittest arguments]
 """
 import array
 import hashlib
@@ -16,14 +15,6 @@ import wave
 
 TOOL = None
 WORK = None
-
-
-def main():
-    global TOOL, WORK
-    TOOL, WORK = sys.argv[1], sys.argv[2]
-    shutil.rmtree(WORK, ignore_errors=True)
-    os.makedirs(WORK)
-    unittest.main(argv=sys.argv[:1] + sys.argv[3:], verbosity=2)
 
 
 def path(name):
@@ -50,13 +41,6 @@ def run(*args, timeout=300, memory=MEMORY_LIMIT, file_size=None):
                           preexec_fn=limits(memory, file_size))
 
 
-def start(*args):
-    """The tool running in the background, for tests that interrupt it."""
-    return subprocess.Popen([TOOL, *map(str, args)], stdout=subprocess.PIPE,
-                            stderr=subprocess.PIPE, text=True, cwd=WORK,
-                            preexec_fn=limits())
-
-
 def example(name, bpm=120, rate=44100, channels=2, seconds=20):
     """The example groove, generated once per work directory."""
     target = path(name)
@@ -68,7 +52,6 @@ def example(name, bpm=120, rate=44100, channels=2, seconds=20):
 
 
 def snapshot():
-    """Every file under the work directory with its digest."""
     files = {}
     for root, _, names in os.walk(WORK):
         for name in names:
@@ -96,7 +79,16 @@ def beats_json(*args):
 
 def read_wav(name):
     """(channels, rate, interleaved 16-bit samples) of a PCM WAV file."""
-    with wave.open(path(name) if not os.path.isabs(name) else name) as w:
+    with wave.open(path(name)) as w:  # an absolute name stays as it is
         assert w.getsampwidth() == 2
         samples = array.array('h', w.readframes(w.getnframes()))
         return w.getnchannels(), w.getframerate(), samples.tolist()
+
+
+if __name__ == '__main__':
+    # The suites import this file as tool_harness, not as __main__.
+    import tool_harness
+    suite, tool_harness.TOOL, tool_harness.WORK = sys.argv[1:4]
+    shutil.rmtree(tool_harness.WORK, ignore_errors=True)
+    os.makedirs(tool_harness.WORK)
+    unittest.main(module=suite, argv=[suite] + sys.argv[4:], verbosity=2)
