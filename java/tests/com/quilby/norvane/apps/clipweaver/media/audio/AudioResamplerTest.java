@@ -56,10 +56,9 @@ public class AudioResamplerTest {
   }
 
   // Raw entries and wrapper, from array and buffer: output at 48000 Hz, the frames asked
-  // cleared unless accumulating, then the input mixed in, interpolated linearly between
-  // neighbouring input frames, the first from the silent frame before the input. At
-  // 44100 Hz the weights are 0, 30105, 27443, 24780 and 22118 (of 32768). Input before
-  // " | " is an earlier block, whose last frame takes the place of the silent one.
+  // cleared unless accumulating, then the input mixed in, interpolated between neighbours
+  // from a silent frame before the input (at 44100 Hz weights 0, 30105, 27443, 24780, 22118
+  // of 32768). Input before " | " is an earlier block, whose last frame replaces the silence.
   @ParameterizedTest(name = "{0}")
   @CsvSource({
     "44100 Hz, 1, false, 44100, 1, 1, 1000 -2000 3000 -4000 0, , 5, false, 0 918 -1513 1781 -1725",
@@ -211,7 +210,8 @@ public class AudioResamplerTest {
         () -> resampler.resample(input, 0, 480, new byte[640], 160, false));
   }
 
-  // A tampered context is refused, and its instance kept, until it is restored.
+  // Bytes to resample count output frames: 2 at 24000 Hz make 4 at 48000. A tampered
+  // context is refused, and its instance kept, until it is restored.
   @Test
   void logsEachProblemOnce() throws Exception {
     ChildJvm child = ChildJvm.run(LogScenario.class);
@@ -219,7 +219,7 @@ public class AudioResamplerTest {
     String tampered = "Bad resampler context: it holds 1 channels and stereo flag 0, its"
         + " instance was made with 2 and 0: call ignored.";
     assertEquals(List.of("Resampler output of 10 bytes is too small for 2000 bytes to clear and"
-            + " 0 bytes to resample: nothing resampled.",
+            + " 8 bytes to resample: nothing resampled.",
             "Resampler input of 8 samples at byte 0 exceeds the 4 bytes given: nothing resampled.",
             tampered, tampered),
         child.nativeTexts());
@@ -232,8 +232,9 @@ public class AudioResamplerTest {
     public static void main(String[] args) {
       ByteBuffer context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
       AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
+      AudioResampler.setSourceSampleRate(context, 24000);
       byte[] output = new byte[10];
-      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 0, output, 1000, false);
+      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 1000, false);
       AudioResampler.resampleFromByteBuffer(context, direct(new byte[4]), 0, 8, output, 0, false);
       AudioResampler.releaseNativeResampler(context);
 
