@@ -46,12 +46,6 @@ public class AudioResamplerTest {
     return ByteBuffer.allocateDirect(bytes.length).put(bytes).clear();
   }
 
-  private static byte[] filled(int size) {
-    byte[] bytes = new byte[size];
-    Arrays.fill(bytes, (byte) 0x55);
-    return bytes;
-  }
-
   private static void resample(ByteBuffer context, boolean fromBuffer, byte[] in, int offset,
       int length, byte[] out, int frames, boolean add) {
     if (fromBuffer) {
@@ -62,17 +56,12 @@ public class AudioResamplerTest {
   }
 
   // Raw entries and wrapper, from array and buffer: output at 48000 Hz, the frames asked
-  // cleared unless accumulating, then the input mixed in, interpolated linearly between
-  // neighbouring input frames, the first from the silent frame before the input. At
-  // 44100 Hz the weights are 0, 30105, 27443, 24780 and 22118 (of 32768). Input before
-  // " | " is an earlier block, whose last frame takes the place of the silent one.
+  // cleared unless accumulating, then the input mixed in, interpolated between neighbours
+  // from a silent frame before the input (at 44100 Hz weights 0, 30105, 27443, 24780, 22118
+  // of 32768). Input before " | " is an earlier block, whose last frame replaces the silence.
   @ParameterizedTest(name = "{0}")
   @CsvSource({
     "44100 Hz, 1, false, 44100, 1, 1, 1000 -2000 3000 -4000 0, , 5, false, 0 918 -1513 1781 -1725",
-    // Negative steps round toward minus infinity.
-    "stereo at 44100 Hz, 2, false, 44100, 1, 1, 1000 -1000 -2000 2000 3000 -3000 -4000 4000 0 0,"
-        + " , 5, false, 0 0 918 -919 -1513 1512 1781 -1782 -1725 1724 - -",
-    "mono, 1, false, 24000, 1, 1, 1000 2000 3000, , 8, false, 0 500 1000 1500 2000 2500 0 0 - -",
     "mono to stereo, 1, true, 24000, 0.5, 2, 1000 2000 3000, , 7, false,"
         + " 0 0 250 1000 500 2000 750 3000 1000 4000 1250 5000 0 0 - -",
     "stereo, 2, false, 24000, 1, -0.5, 1000 -1000 2000 -2000 3000 -3000, , 7, false,"
@@ -80,8 +69,6 @@ public class AudioResamplerTest {
     "stereo after a block, 2, false, 24000, 1, -0.5, 5000 -5000 3000 -3000 | 1000 -1000 2000 -2000,"
         + " , 4, false, 3000 1500 2000 1000 1000 500 1500 750",
     "no input, 2, true, 24000, 1, 1, , , 3, false, 0 0 0 0 0 0 - -",
-    // 1000 times 1e10 saturates to 2^31 - 1, whose low 16 bits are -1; a NaN product is 0.
-    "huge and NaN gains, 1, true, 48000, 1e10, NaN, 0 1000 0, , 3, false, 0 0 0 0 -1 0",
     // Accumulating ignores the frames to clear; -30000 + -15000 wraps to 20536.
     "accumulating, 1, true, 48000, 1, -0.5, 4 30000 0, 10 20 30 40 30000 -30000 5 5, 9, true,"
         + " 10 20 34 38 -5536 20536 5 5",
@@ -163,14 +150,15 @@ public class AudioResamplerTest {
       AudioResampler.setVolume(context, 1, 1);
       AudioResampler.setSourceSampleRate(context, 48000);
       byte[] input = new byte[1764];
-      byte[] output = filled(outputBytes);
+      byte[] untouched = pcm("- ".repeat(outputBytes / 2).strip());
+      byte[] output = untouched.clone();
       if (kind.equals("heap input")) {
         AudioResampler.resampleFromByteBuffer(
             context, ByteBuffer.wrap(input), offset, length, output, frames, accumulate);
       } else {
         resample(context, fromBuffer, input, offset, length, output, frames, accumulate);
       }
-      assertArrayEquals(filled(outputBytes), output, name + (fromBuffer ? " (buffer)" : ""));
+      assertArrayEquals(untouched, output, name + (fromBuffer ? " (buffer)" : ""));
       if (kind.matches("(channels|flag) .")) context.putInt(8, channels).put(12, (byte) 0);
       AudioResampler.releaseNativeResampler(context);
       if (context != null) assertEquals(0L, context.getLong(0));
@@ -222,25 +210,20 @@ public class AudioResamplerTest {
         () -> resampler.resample(input, 0, 480, new byte[640], 160, false));
   }
 
-  // A tampered context is refused, and its instance kept, until it is restored.
+  // Bytes to resample count output frames: 2 at 24000 Hz make 4 at 48000. A tampered
+  // context is refused, and its instance kept, until it is restored.
   @Test
   void logsEachProblemOnce() throws Exception {
     ChildJvm child = ChildJvm.run(LogScenario.class);
     assertEquals("true\n0\n", child.stdout());
-    String tampered = "native : resampler_bridge.cc: Bad resampler context: it holds 1 channels"
-        + " and stereo flag 0, its instance was made with 2 and 0: call ignored.";
-    assertEquals(
-        List.of(
-            "AudioResampler : Unsupported sample format, 8 bits, 1 channels",
-            "AudioResampler : Unsupported resampling from 0 Hz to 48000 Hz: no output",
-            "native : resampler_bridge.cc: Resampler output of 10 bytes is too small for"
-                + " 2000 bytes to clear and 0 bytes to resample: nothing resampled.",
-            "native : resampler_bridge.cc: Resampler input of 8 samples at byte 0 exceeds"
-                + " the 4 bytes given: nothing resampled.",
-            tampered,
-            tampered),
-        // Without line numbers.
-        child.stderr().lines().map(line -> line.replaceFirst("\\.cc:[0-9]+ ", ".cc: ")).toList());
+    String tampered = "Bad resampler context: it holds 1 channels and stereo flag 0, its"
+        + " instance was made with 2 and 0: call ignored.";
+    assertEquals(List.of("Resampler output of 10 bytes is too small for 2000 bytes to clear and"
+            + " 8 bytes to resample: nothing resampled.",
+            "Resampler input of 8 samples at byte 0 exceeds the 4 bytes given: nothing resampled.",
+            tampered, tampered),
+        child.nativeTexts());
+    assertEquals(child.nativeTexts().size(), child.stderr().lines().count());
   }
 
   /** The calls of {@link #logsEachProblemOnce}, run in a child JVM whose stderr is read. */
@@ -248,18 +231,13 @@ public class AudioResamplerTest {
     // Without JUnit on the class path, so without the checks of created().
     public static void main(String[] args) {
       ByteBuffer context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
-      AudioResampler.createNativeResampler(context, 1, 1, 48000, false);
-      AudioResampler.releaseNativeResampler(context);
       AudioResampler.createNativeResampler(context, 2, 1, 48000, false);
-      AudioResampler.setSourceSampleRate(context, 0);
+      AudioResampler.setSourceSampleRate(context, 24000);
       byte[] output = new byte[10];
-      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
-      AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 5, false);
       AudioResampler.resampleFromByteArray(context, new byte[4], 0, 2, output, 1000, false);
       AudioResampler.resampleFromByteBuffer(context, direct(new byte[4]), 0, 8, output, 0, false);
       AudioResampler.releaseNativeResampler(context);
 
-      context = ByteBuffer.allocateDirect(16).order(ByteOrder.nativeOrder());
       AudioResampler.createNativeResampler(context, 2, 2, 48000, false);
       context.putInt(8, 1);
       AudioResampler.setVolume(context, 0, 0);
