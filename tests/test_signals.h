@@ -1,8 +1,10 @@
 // Test signals made with integer arithmetic only, so they are the same on
-// every target: noise, tones, decays and click tracks of 16-bit PCM.
+// every target: noise, tones, decays and click tracks of 16-bit PCM; and the
+// digest that golden outputs are kept as.
 #ifndef CLIPWEAVER_TESTS_TEST_SIGNALS_H_
 #define CLIPWEAVER_TESTS_TEST_SIGNALS_H_
 
+#include <cstddef>
 #include <cstdint>
 #include <vector>
 
@@ -61,6 +63,13 @@ inline std::vector<int16_t> Clicks(int32_t rate, int32_t channels,
     for (int32_t c = 0; c < channels; ++c) pcm[i * channels + c] = v;
   }
   return pcm;
+}
+
+// FNV-1a over bytes, continuing from `hash`.
+inline uint64_t Fnv1a(const void* data, size_t size, uint64_t hash = 0xcbf29ce484222325u) {
+  const auto* bytes = static_cast<const unsigned char*>(data);
+  for (size_t i = 0; i < size; ++i) hash = (hash ^ bytes[i]) * 0x100000001b3u;
+  return hash;
 }
 
 }  // namespace test_signals

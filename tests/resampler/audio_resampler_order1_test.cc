@@ -10,6 +10,7 @@
 #include <vector>
 
 #include "resampler/audio_resampler.h"
+#include "tests/test_signals.h"
 
 namespace norvane {
 namespace {
@@ -76,15 +77,6 @@ TEST(Order1, LargeGainPathKeepsTheRightChannelInStep) {
             (Samples{0, 0, 0, 10, 0, 20, 0, 30}));
 }
 
-// FNV-1a over bytes.
-struct Digest {
-  void Add(const void* data, size_t size) {
-    const unsigned char* bytes = static_cast<const unsigned char*>(data);
-    for (size_t i = 0; i < size; ++i) value = (value ^ bytes[i]) * 0x100000001b3u;
-  }
-  uint64_t value = 0xcbf29ce484222325u;
-};
-
 // A stream of 600 random blocks (seed 20240611) of up to 700 loud frames,
 // mixed into outputs that are either zero or random, with the source rate,
 // the gains or the position changed now and then. The digest covers every
@@ -96,7 +88,7 @@ uint64_t StreamDigest(int channels, bool stereoOutput, int32_t outputRate) {
     return std::uniform_int_distribution<int>(lo, hi)(random);
   };
   auto r = Make(channels, outputRate, outputRate, 1.0f, 1.0f, stereoOutput);
-  Digest digest;
+  uint64_t digest = test_signals::Fnv1a(nullptr, 0);
   for (int block = 0; block < 600; ++block) {
     const int event = uniform(0, 9);
     if (event == 0) {
@@ -117,10 +109,10 @@ uint64_t StreamDigest(int channels, bool stereoOutput, int32_t outputRate) {
     }
     r->resample(out.data(), in.data(), in.size() / channels);
     const uint32_t fraction = r->getPhaseFraction();
-    digest.Add(out.data(), out.size() * sizeof(int16_t));
-    digest.Add(&fraction, sizeof(fraction));
+    digest = test_signals::Fnv1a(out.data(), out.size() * sizeof(int16_t), digest);
+    digest = test_signals::Fnv1a(&fraction, sizeof(fraction), digest);
   }
-  return digest.value;
+  return digest;
 }
 
 TEST(Order1, LongRandomStreamsKeepTheirDigests) {

@@ -141,16 +141,6 @@ std::string Listing(const std::vector<uint32_t>& bits) {
   return text;
 }
 
-// FNV-1a over the bytes of the values.
-uint64_t Fingerprint(const std::vector<float>& values) {
-  uint64_t hash = 0xcbf29ce484222325u;
-  const auto* bytes = reinterpret_cast<const unsigned char*>(values.data());
-  for (size_t i = 0; i < values.size() * sizeof(float); ++i) {
-    hash = (hash ^ bytes[i]) * 0x100000001b3u;
-  }
-  return hash;
-}
-
 class GoldenBeats : public testing::TestWithParam<Groove> {};
 
 TEST_P(GoldenBeats, MatchBitForBit) {
@@ -166,7 +156,9 @@ TEST_P(GoldenBeats, MatchBitForBit) {
   if (count > 0) std::memcpy(bits.data(), analyzer.beats(), bits.size() * 4);
   EXPECT_EQ(g.beat_bits, bits) << "Beats now:\n" << Listing(bits);
   // Tells whether a difference starts before the tracker.
-  const uint64_t fingerprint = Fingerprint(analyzer.detection_function());
+  const std::vector<float>& detection = analyzer.detection_function();
+  const uint64_t fingerprint =
+      test_signals::Fnv1a(detection.data(), detection.size() * sizeof(float));
   EXPECT_EQ(g.detection_fingerprint, fingerprint)
       << "the detection function differs: 0x" << std::hex << fingerprint;
   // The goldens are real beats: the tracker found the groove's tempo.
