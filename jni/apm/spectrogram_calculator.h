@@ -44,8 +44,6 @@ class SpectrogramCalculator {
 
   int32_t frames_per_second() const { return frames_per_second_; }
   int32_t bin_count() const { return spectrogram_.bin_count(); }
-  int64_t num_input_samples() const { return num_input_samples_; }
-  int64_t num_frames() const { return num_frames_; }
 
  private:
   bool Failed();
@@ -55,6 +53,8 @@ class SpectrogramCalculator {
   Spectrogram spectrogram_;
   int32_t window_length_samples_ = 0;
   int32_t overlap_samples_ = 0;
+  // Samples taken and frames made since Initialize; for a debugger, as
+  // nothing in the analysis reads them.
   int64_t num_input_samples_ = 0;
   int64_t num_frames_ = 0;
   int32_t frames_per_second_ = 0;
