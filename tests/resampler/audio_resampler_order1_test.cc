@@ -70,11 +70,12 @@ TEST(Order1, ProductsTruncateSaturateAndSumsWrap) {
 }
 
 // A gain too large for the one-register path sends stereo input down the
-// sample-by-sample one, where the right channel must keep step too.
+// sample-by-sample one, where the right channel must keep step too and the
+// left one's products saturate (adding 0xffff).
 TEST(Order1, LargeGainPathKeepsTheRightChannelInStep) {
   auto r = Make(2, 48000, 48000, 1e5f, 1.0f);
-  EXPECT_EQ(Resample(r.get(), {0, 10, 0, 20, 0, 30, 0, 40}, 2, 8),
-            (Samples{0, 0, 0, 10, 0, 20, 0, 30}));
+  EXPECT_EQ(Resample(r.get(), {30000, 10, 30000, 20, 30000, 30, 30000, 40}, 2, 8),
+            (Samples{0, 0, -1, 10, -1, 20, -1, 30}));
 }
 
 // A stream of 600 random blocks (seed 20240611) of up to 700 loud frames,
