@@ -34,21 +34,18 @@ void BeamSelector::Reselect(const double* values, int32_t count,
     Select(values, count, width, beam);
     return;
   }
-  changed_mark_.resize(count, 0);
-  if (++generation_ == 0) {
-    std::fill(changed_mark_.begin(), changed_mark_.end(), 0);
-    generation_ = 1;
-  }
+  changed_.Grow(count);
+  changed_.NextGeneration();
   fresh_.clear();
   for (int32_t i = 0; i < changed_count; ++i) {
     const int32_t s = changed[i];
-    changed_mark_[s] = generation_;
+    changed_.Mark(s);
     if (values[s] >= floor_) fresh_.push_back({s, values[s]});
   }
   std::sort(fresh_.begin(), fresh_.end(), Larger);
   ranked_.erase(std::remove_if(ranked_.begin(), ranked_.end(),
                                [this](const BeamEntry& e) {
-                                 return changed_mark_[e.state] == generation_;
+                                 return changed_.Marked(e.state);
                                }),
                 ranked_.end());
   above_.resize(ranked_.size() + fresh_.size());

@@ -6,6 +6,8 @@
 #include <cstdint>
 #include <vector>
 
+#include "jni/apm/generation_marks.h"
+
 namespace apm {
 
 struct BeamEntry {
@@ -58,8 +60,8 @@ class BeamSelector {
   std::vector<BeamEntry> ranked_;
   double floor_ = 0.0;
   bool has_floor_ = false;
-  std::vector<uint32_t> changed_mark_;
-  uint32_t generation_ = 0;
+  // The states the current Reselect was told changed.
+  GenerationMarks changed_;
 };
 
 }  // namespace apm

@@ -2,7 +2,7 @@
 
 #include "base/instruction_set.h"
 #include "fft/real_fft.h"
-#include "jni/apm/frame_conversion_avx.h"
+#include "jni/apm/window_frame_avx.h"
 
 namespace apm {
 

@@ -17,6 +17,11 @@ class GenerationMarks {
     generation_ = 0;
   }
 
+  // Grows the set to `size` indices, keeping its marks.
+  void Grow(size_t size) {
+    if (marks_.size() < size) marks_.resize(size, 0);
+  }
+
   // Generation 0 stands for "never marked", so a wrap clears for real.
   void NextGeneration() {
     if (++generation_ == 0) {
@@ -24,6 +29,9 @@ class GenerationMarks {
       generation_ = 1;
     }
   }
+
+  // Whether index was marked in this generation (after NextGeneration).
+  bool Marked(size_t index) const { return marks_[index] == generation_; }
 
   // True when index was not yet marked in this generation; marks it.
   bool Mark(size_t index) { return Marker{marks_.data(), generation_}.Mark(index); }

@@ -1,4 +1,4 @@
-#include "jni/apm/frame_conversion_avx.h"
+#include "jni/apm/window_frame_avx.h"
 
 #include <immintrin.h>
 

@@ -1,7 +1,7 @@
 // The windowing kernel of frame_transform.h, built apart with AVX; the
 // same bits as the plain loop. Call only where instruction_set::HasAvx().
-#ifndef CLIPWEAVER_JNI_APM_FRAME_CONVERSION_AVX_H_
-#define CLIPWEAVER_JNI_APM_FRAME_CONVERSION_AVX_H_
+#ifndef CLIPWEAVER_JNI_APM_WINDOW_FRAME_AVX_H_
+#define CLIPWEAVER_JNI_APM_WINDOW_FRAME_AVX_H_
 
 #include <cstdint>
 
@@ -14,4 +14,4 @@ void WindowFrameAvx(const float* samples, const double* window,
 
 }  // namespace apm
 
-#endif  // CLIPWEAVER_JNI_APM_FRAME_CONVERSION_AVX_H_
+#endif  // CLIPWEAVER_JNI_APM_WINDOW_FRAME_AVX_H_
