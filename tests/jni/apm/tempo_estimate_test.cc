@@ -3,75 +3,53 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
+#include <fstream>
 #include <random>
+#include <sstream>
+#include <string>
 #include <vector>
 
 namespace apm {
 namespace {
 
-// count beats `period` seconds apart, from `start` or one period after the
-// last of `before`.
-std::vector<double> Steady(int count, double period, std::vector<double> before = {},
-                           double start = 0.3) {
-  if (!before.empty()) start = before.back() + period;
-  for (int i = 0; i < count; ++i) before.push_back(start + i * period);
-  return before;
-}
-
-std::vector<double> Jittered(int count, double period, double jitter) {
-  std::mt19937 random(7);
-  std::normal_distribution<double> offset(0, jitter);
-  std::vector<double> beats = Steady(count, period);
-  for (double& b : beats) b += offset(random);
-  return beats;
-}
-
-std::vector<double> WithoutBeat(std::vector<double> beats, size_t index) {
-  beats.erase(beats.begin() + index);
-  return beats;
-}
-
-// Whole frames at 100 per second, as the tracker gives them.
-std::vector<double> OnFrames(std::vector<double> beats) {
-  for (double& b : beats) b = std::round(b * 100) / 100;
-  return beats;
-}
-
-TEST(PreciseTempo, BeatLists) {
-  const struct {
-    const char* name;
+// The cases the Java twin checks too.
+TEST(PreciseTempo, SharedBeatLists) {
+  std::ifstream cases(CLIPWEAVER_SOURCE_DIR "/tests/jni/apm/precise_tempo_cases.tsv");
+  ASSERT_TRUE(cases.good());
+  std::string line;
+  int rows = 0;
+  while (std::getline(cases, line)) {
+    if (line.empty() || line[0] == '#') continue;
+    std::istringstream fields(line);
+    std::string name, runs, noise, bpm_text, tolerance;
+    std::getline(fields, name, '\t');
+    std::getline(fields, runs, '\t');
+    std::getline(fields, noise, '\t');
+    std::getline(fields, bpm_text, '\t');
+    std::getline(fields, tolerance);
+    const double bpm = std::stod(bpm_text);  // reads NaN, where >> does not
+    std::istringstream run_fields(runs);
     std::vector<double> beats;
-    double bpm;  // NaN: no tempo
-    double tolerance;
-  } rows[] = {
-      {"steady", Steady(30, 0.5), 120, 1e-9},
-      {"steady slow", Steady(20, 1.0), 60, 1e-9},
-      {"117.6 BPM on whole frames", OnFrames(Steady(60, 60 / 117.6)), 117.6, 0.05},
-      {"jittered by 10 ms", Jittered(80, 0.5, 0.01), 120, 0.3},
-      {"one beat missing", WithoutBeat(Steady(30, 0.5), 12), 120, 1e-9},
-      {"first beat missing", WithoutBeat(Steady(30, 0.5), 1), 120, 1e-9},
-      {"tempo change: the longer part", Steady(60, 60.0 / 130, Steady(40, 0.6)), 130, 1e-9},
-      {"tempo change: the longer part first", Steady(40, 0.6, Steady(60, 60.0 / 130)), 130, 1e-9},
-      // A tracker settling at a shorter period before it locks on stays out
-      // of the fit but for its last beat, 40 ms off the line: fitted whole,
-      // the run would read 100.44 BPM.
-      {"settling", Steady(40, 0.6, Steady(8, 0.56, {}, 0.0)), 100, 0.03},
-      {"three beats", Steady(3, 0.4), 150, 1e-9},
-      // The median of an even count is the upper middle: 2 s, not 1 s.
-      {"1 s twice, then 2 s twice", {0, 1, 2, 4, 6}, 30, 1e-9},
-      {"two beats", Steady(2, 0.5), NAN, 0},
-      {"one beat", Steady(1, 0.5), NAN, 0},
-      {"no beats", {}, NAN, 0},
-      {"nothing steady", {0, 0.5, 1.3, 1.6, 2.7, 3.0}, NAN, 0},
-  };
-  for (const auto& row : rows) {
-    const double bpm = PreciseTempo(row.beats);
-    if (std::isnan(row.bpm)) {
-      EXPECT_TRUE(std::isnan(bpm)) << row.name << ": " << bpm;
-    } else {
-      EXPECT_NEAR(bpm, row.bpm, row.tolerance) << row.name;
+    double value, period;
+    if (run_fields >> value) beats.push_back(value);
+    for (int count; run_fields >> count >> period;) {
+      const double from = beats.back();
+      for (int k = 1; k <= count; ++k) beats.push_back(from + k * period);
     }
+    std::mt19937 random(7);
+    for (double& b : beats) {
+      if (noise == "frames") b = std::round(b * 100) / 100;
+      else if (noise != "0") b += std::normal_distribution<double>(0, std::stod(noise))(random);
+    }
+    const double got = PreciseTempo(beats);
+    if (std::isnan(bpm)) {
+      EXPECT_TRUE(std::isnan(got)) << name << ": " << got;
+    } else {
+      EXPECT_NEAR(got, bpm, std::stod(tolerance)) << name;
+    }
+    ++rows;
   }
+  EXPECT_GE(rows, 15);
 }
 
 }  // namespace

@@ -192,49 +192,52 @@ class DefaultLocalMusicDetailExtractorTest {
     assertArrayEquals(new float[] {beat}, beatsOf(pcm, pcm.capacity(), 44100, 1), kind);
   }
 
-  // Beats from a start time on in runs of (count, period), each run following
-  // the last beat, moved by Gaussian noise of the deviation given. Float beat
-  // times, as the extractor returns them, cost some precision.
-  @ParameterizedTest(name = "{0}")
-  @CsvSource({
-    "steady, 0, 0.3 29 0.5, 120, 1e-3",
-    "jittered by 10 ms, 0.01, 0.3 79 0.5, 120, 0.3",
-    "one beat missing, 0, 0.3 11 0.5 1 1.0 16 0.5, 120, 1e-3",
-    "longer of two tempi, 0, 0.3 39 0.6 60 0.46153846, 130, 1e-3",
-    "three beats, 0, 0.3 2 0.4, 150, 1e-3",
-    "settling at 107 BPM first, 0, 0 7 0.56 40 0.6, 100, 0.03",
-    "two beats, 0, 0.3 1 0.5, NaN, 0",
-    "nothing steady, 0, 0 1 0.5 1 0.8 1 0.3 1 1.1 1 0.3, NaN, 0",
-  })
-  void preciseTempoOfBeatLists(String name, double jitter, String runs, double bpm,
-      double tolerance) {
-    double[] r = Arrays.stream(runs.split(" ")).mapToDouble(Double::parseDouble).toArray();
-    List<Double> times = new ArrayList<>(List.of(r[0]));
-    for (int i = 1; i < r.length; i += 2) {
-      double from = times.get(times.size() - 1);
-      for (int k = 1; k <= r[i]; k++) times.add(from + k * r[i + 1]);
+  // The native test reads the same table. Float beat times, as the extractor
+  // returns them, cost some precision.
+  @Test
+  void preciseTempoOfTheSharedBeatLists() throws Exception {
+    List<String> cases = sharedCases("precise_tempo_cases.tsv");
+    assertTrue(cases.size() >= 15);
+    for (String line : cases) {
+      String[] f = line.split("\t", -1);
+      double[] r = f[1].isEmpty() ? new double[0]
+          : Arrays.stream(f[1].split(" ")).mapToDouble(Double::parseDouble).toArray();
+      List<Double> times = new ArrayList<>();
+      if (r.length > 0) times.add(r[0]);
+      for (int i = 1; i < r.length; i += 2) {
+        double from = times.get(times.size() - 1);
+        for (int k = 1; k <= r[i]; k++) times.add(from + k * r[i + 1]);
+      }
+      Random random = new Random(7);
+      float[] beats = new float[times.size()];
+      for (int i = 0; i < beats.length; i++) {
+        double t = times.get(i);
+        if (f[2].equals("frames")) t = Math.round(t * 100) / 100.0;
+        else t += random.nextGaussian() * Double.parseDouble(f[2]);
+        beats[i] = (float) t;
+      }
+      assertEquals(Double.parseDouble(f[3]), Tempo.precise(beats),
+          Math.max(Double.parseDouble(f[4]), 1e-3), f[0]);
     }
-    Random random = new Random(7);
-    float[] beats = new float[times.size()];
-    for (int i = 0; i < beats.length; i++) {
-      beats[i] = (float) (times.get(i) + random.nextGaussian() * jitter);
-    }
-    assertEquals(bpm, Tempo.precise(beats), tolerance);
+  }
+
+  private static List<String> sharedCases(String name) throws Exception {
+    Path cases = Path.of(System.getProperty("clipweaver.source"), "tests/jni/apm", name);
+    return Files.readAllLines(cases).stream()
+        .filter(line -> !line.isEmpty() && !line.startsWith("#")).toList();
   }
 
   // The native library reads the same table: both refuse the same ranges in
   // the same words, and the extractor refuses them before any work.
   @Test
   void badRangesAreRefusedAsByTheNativeLibrary() throws Exception {
-    Path cases =
-        Path.of(System.getProperty("clipweaver.source"), "tests/jni/apm/tempo_range_cases.tsv");
     List<Integer> progress = new ArrayList<>();
     DefaultLocalMusicDetailExtractor extractor =
         new DefaultLocalMusicDetailExtractor(p -> !progress.add(p));
     ByteBuffer pcm = ByteBuffer.allocateDirect(88200);
-    int rows = 0;
-    for (String line : Files.readAllLines(cases)) {
-      if (line.isEmpty() || line.startsWith("#")) continue;
+    List<String> cases = sharedCases("tempo_range_cases.tsv");
+    assertTrue(cases.size() >= 10);
+    for (String line : cases) {
       String[] f = line.split("\t", -1);
       float min = Float.parseFloat(f[0]);
       float max = Float.parseFloat(f[1]);
@@ -245,9 +248,7 @@ class DefaultLocalMusicDetailExtractorTest {
         assertEquals(error, assertThrows(IllegalArgumentException.class, () ->
             extractor.calculateBeatsInSec(pcm, pcm.capacity(), rate, 1, min, max)).getMessage());
       }
-      rows++;
     }
-    assertTrue(rows >= 10);
     assertEquals(List.of(), progress);
   }
 }
