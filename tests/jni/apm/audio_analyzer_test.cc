@@ -189,18 +189,29 @@ TEST(AudioAnalyzer, ReadsNothingPastTheInput) {
   }
 }
 
-TEST(AudioAnalyzer, AStoppedRunIgnoresLaterBlocks) {
+// Stopped at its second progress report, a run ignores later blocks, and
+// the next run on the same analyzer gives what a fresh one gives.
+TEST(AudioAnalyzer, AStoppedRunIgnoresLaterBlocksAndLeavesTheAnalyzerReady) {
   const std::vector<int16_t> pcm = test_signals::Clicks(8000, 2, 3, 0.5);
   const int32_t frames = static_cast<int32_t>(pcm.size() / 2);
   int calls = 0;
   AudioAnalyzer analyzer(8000);
   testing::internal::CaptureStderr();
-  ASSERT_TRUE(analyzer.Begin(2, frames, [&calls](char) { return calls++ == 0; }));
+  ASSERT_TRUE(analyzer.Begin(2, frames, [&calls](char) { return calls++ == 1; }));
   EXPECT_FALSE(analyzer.Feed(pcm.data(), frames));
   EXPECT_FALSE(analyzer.Feed(pcm.data(), frames));
   EXPECT_EQ(analyzer.Finish(), -1);
+  EXPECT_EQ(calls, 2);
+  Outcome again;
+  again.count = analyzer.CalculateBeats(reinterpret_cast<const uint8_t*>(pcm.data()),
+                                        Bytes(pcm), 2, [&again](char p) {
+                                          again.progress.push_back(p);
+                                          return false;
+                                        });
   testing::internal::GetCapturedStderr();
-  EXPECT_EQ(calls, 1);
+  const Outcome fresh = Analyze(pcm, Bytes(pcm), 8000, 2);
+  EXPECT_EQ(again.progress, fresh.progress);
+  EXPECT_EQ(std::vector<float>(analyzer.beats(), analyzer.beats() + again.count), fresh.beats);
 }
 
 }  // namespace
