@@ -256,6 +256,11 @@ inline void SecondStage4(double* p, std::ptrdiff_t im) {
 template <typename V, typename W>
 void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t);
 
+// The first three stages forward in blocks of eight (paired_radix4.h), for
+// a W that holds two V and h = n/4 an odd power of two from 32 on.
+template <typename V, typename W>
+void FirstStagesOfEight(int n, double* a);
+
 // The complex stage up to its last stage, forward (exp(+...)) or on the
 // conjugated input: a decimation in time of the h = n/4 elements from
 // bit-reversed order to natural order, taking one or two first stages so
@@ -266,6 +271,15 @@ void LaneTransform(int n, double* a, const double* w_end) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int length = 16;
+  if constexpr (!kConj && !std::is_same_v<V, W>) {
+    if (n >= 128 && !(n & 0x55555555)) {
+      FirstStagesOfEight<V, W>(n, a);
+      for (length = 32; length <= h; length *= 4) {
+        PairedRadix4Pass<V, W>(length, a, im, h, w_end - length / 2);
+      }
+      return;
+    }
+  }
   if (n >= 64 && (n & 0x55555555)) {
     FirstStages<V, V, kConj, 2>(n, a);
   } else {
