@@ -106,40 +106,40 @@ __attribute__((flatten)) void PairedRadix4Pass(int length, double* a, std::ptrdi
            Split(Unturned(), TurnThreeEighths()));
     return;
   }
-  // Turns of two columns from their w^k and conj(w^3k), one column per
-  // half, or of their mirrors: w^(q - k) = i conj(w^k),
-  // w^2(q - k) = -conj(w^2k), w^3(q - k) = -i conj(w^3k).
-  const auto turns = [](W w1, W w3, bool mirror, auto f) {
-    const W w2 = Square(w1);
-    const W c1 = DupLow(w1), s1 = DupHigh(w1), c2 = DupLow(w2), s2 = DupHigh(w2);
-    const W c3 = DupLow(w3), s3 = DupHigh(w3);
-    if (mirror) {
-      f(Turn<W>{Neg(c2), s2}, Turn<W>{s1, c1}, TurnConj<W>{s3, c3});
-    } else {
-      f(Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
-    }
-  };
-  V previous1 = Splat<V>(0), previous3 = previous1;
-  ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
-    if (k == 1) {
-      turns(Join(w1, w1), Join(w3, w3), false, [&](auto t2, auto t1, auto t3) {
-        column(a, Split(Unturned(), t2), Split(Unturned(), t1), Split(Unturned(), t3));
-      });
-    } else if (k % 2) {
-      turns(Join(previous1, w1), Join(previous3, w3), false,
-            [&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
-    } else {
-      turns(Join(w1, previous1), Join(w3, previous3), true,
-            [&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
-    }
-    previous1 = w1;
-    previous3 = w3;
-  });
-  turns(Join(previous1, previous1), Join(previous3, previous3), true,
-        [&](auto t2, auto t1, auto t3) {
-          column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1),
-                 Split(TurnThreeEighths(), t3));
+  // Turns of two columns, one per half.
+  const auto turns = [](W w1, W w3, bool mirror, auto f) { ColumnTurns(w1, w3, mirror, f); };
+  const auto pass = [&](auto column) {
+    V previous1 = Splat<V>(0), previous3 = previous1;
+    ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
+      if (k == 1) {
+        turns(Join(w1, w1), Join(w3, w3), false, [&](auto t2, auto t1, auto t3) {
+          column(a, Split(Unturned(), t2), Split(Unturned(), t1), Split(Unturned(), t3));
         });
+      } else if (k % 2) {
+        turns(Join(previous1, w1), Join(previous3, w3), false,
+              [&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
+      } else {
+        turns(Join(w1, previous1), Join(w3, previous3), true,
+              [&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
+      }
+      previous1 = w1;
+      previous3 = w3;
+    });
+    turns(Join(previous1, previous1), Join(previous3, previous3), true,
+          [&](auto t2, auto t1, auto t3) {
+            column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1),
+                   Split(TurnThreeEighths(), t3));
+          });
+  };
+  // In the last pass a column is one butterfly, without a loop to keep
+  // the twiddles in registers across.
+  if (length == h) {
+    pass([&](double* p, auto turn2, auto turn1, auto turn3) {
+      Radix4<W>(p, s, im, turn2, turn1, turn3);
+    });
+  } else {
+    pass(column);
+  }
 }
 
 }  // namespace CLIPWEAVER_ISA

@@ -63,19 +63,70 @@ inline CombinedGroup<V> CombineGroup(Complex2<V> xk, Complex2<V> xm, V wr, V wi,
 
 // Groups k and k + 1 side by side in W, for the places x and y of group k;
 // the places of group k + 1 lie above (+) or below (-) them. The twiddles
-// and the weights c_km come as W already, one group per half.
+// and the weights c_km come as W already, one group per half. at_px and
+// at_py hold what lies at the W-wide places px and py.
 template <typename W, bool kForward, int kXDirection, int kYDirection>
-inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c_km) {
-  double* const px = kXDirection > 0 ? x : x - 2;
-  double* const py = kYDirection > 0 ? y : y - 2;
+inline void CombinePairOf(double* px, double* py, std::ptrdiff_t im, Complex2<W> at_px,
+                          Complex2<W> at_py, W wr, W wi, W c_km) {
   const auto in_order = [](W v, int direction) { return direction > 0 ? v : SwapHalves(v); };
-  const Complex2<W> xk = {in_order(Load<W>(px), kXDirection), in_order(Load<W>(px + im), kXDirection)};
-  const Complex2<W> xm = {in_order(Load<W>(py), kYDirection), in_order(Load<W>(py + im), kYDirection)};
+  const Complex2<W> xk = {in_order(at_px.re, kXDirection), in_order(at_px.im, kXDirection)};
+  const Complex2<W> xm = {in_order(at_py.re, kYDirection), in_order(at_py.im, kYDirection)};
   const CombinedGroup<W> out = CombineGroup<W, kForward>(xk, xm, wr, wi, c_km, Swap(c_km));
   Store(px, in_order(out.at_x, kXDirection));
   Store(py, in_order(out.at_y, kYDirection));
   Store(px + im, in_order(out.at_x_im, kXDirection));
   Store(py + im, in_order(out.at_y_im, kYDirection));
+}
+template <typename W, bool kForward, int kXDirection, int kYDirection>
+inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c_km) {
+  double* const px = kXDirection > 0 ? x : x - 2;
+  double* const py = kYDirection > 0 ? y : y - 2;
+  CombinePairOf<W, kForward, kXDirection, kYDirection>(px, py, im, Get<W>(px, im), Get<W>(py, im),
+                                                       wr, wi, c_km);
+}
+
+// One group of Combine on its own: the places x and y, w^k = (wr, wi)
+// with the second lane of wr negated, and the split weights at ck and cm.
+template <typename V, bool kForward>
+inline void CombineOne(double* x, double* y, std::ptrdiff_t im, V wr, V wi, const double* ck,
+                       const double* cm) {
+  const CombinedGroup<V> out = CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi,
+                                                         Make<V>(*ck, *cm), Make<V>(*cm, *ck));
+  Store(x, out.at_x);
+  Store(y, out.at_y);
+  Store(x + im, out.at_x_im);
+  Store(y + im, out.at_y_im);
+}
+
+// The groups k, h - k, h/2 - k and h/2 + k of Combine, twiddle w = w^k.
+template <typename V, bool kForward>
+inline void CombineFour(double* a, int h, std::ptrdiff_t k, V w, const double* c, int nc) {
+  const std::ptrdiff_t im = 2 * h, kk = k * (nc / h);
+  const V negated = Neg(w);
+  CombineOne<V, kForward>(a + 2 * k, a + im - 2 * k, im, UnpackLow(w, negated), DupHigh(w),
+                          c + kk, c + nc - kk);
+  CombineOne<V, kForward>(a + h - 2 * k, a + h + 2 * k, im, UnpackHigh(w, negated), DupLow(w),
+                          c + nc / 2 - kk, c + nc / 2 + kk);
+}
+
+// Combine's element 0 and the groups h/4 and h/2, which pair with
+// themselves or take fixed twiddles.
+template <typename V, bool kForward>
+inline void CombineFixed(double* a, int h, const double* c, int nc) {
+  const std::ptrdiff_t im = 2 * h;
+  // Element 0 gives X[0] = E[0] + O[0] and X[h] = E[0] - O[0].
+  const V sign = Make<V>(1, kForward ? 1 : -1);
+  const V re = Load<V>(a), im0 = Load<V>(a + im);
+  const V even = UnpackLow(re, im0), odd = UnpackHigh(re, im0);
+  Store(a, (even + odd) * sign);
+  Store(a + im, (even - odd) * sign);
+  if (h >= 4) {
+    const V c4 = Splat<V>(kC4);
+    CombineOne<V, kForward>(a + h / 2, a + im - h / 2, im, c4 * Make<V>(1, -1), c4, c + nc / 4,
+                            c + nc - nc / 4);
+  }
+  CombineOne<V, kForward>(a + h, a + h, im, Make<V>(0, -0.0), Splat<V>(1), c + nc / 2,
+                          c + nc / 2);
 }
 
 // Last complex stage over the whole lane layout, back to (re, im) pairs in
@@ -91,20 +142,7 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   const std::ptrdiff_t step = nc / h;
   const double* const c_end = c + nc;
   const double* const c_half = c + nc / 2;
-  auto group = [&](double* x, double* y, V wr, V wi, const double* ck, const double* cm) {
-    const CombinedGroup<V> out = CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi,
-                                                           Make<V>(*ck, *cm), Make<V>(*cm, *ck));
-    Store(x, out.at_x);
-    Store(y, out.at_y);
-    Store(x + im, out.at_x_im);
-    Store(y + im, out.at_y_im);
-  };
-  // Element 0 gives X[0] = E[0] + O[0] and X[h] = E[0] - O[0].
-  const V sign = Make<V>(1, kForward ? 1 : -1);
-  const V re = Load<V>(a), im0 = Load<V>(a + im);
-  const V even = UnpackLow(re, im0), odd = UnpackHigh(re, im0);
-  Store(a, (even + odd) * sign);
-  Store(a + im, (even - odd) * sign);
+  CombineFixed<V, kForward>(a, h, c, nc);
   // Group h/2 - k takes w^(h/2 - k) = i conj(w^k). With W wider than V,
   // groups k and k + 1 run together for odd k.
   struct Twiddles {
@@ -147,24 +185,98 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
       half_up += 2 * step;
       return;
     }
-    const V negated = Neg(w);
-    const std::ptrdiff_t kk = k * step;
-    group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
-    group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
-          c_half + kk);
+    CombineFour<V, kForward>(a, h, k, w, c, nc);
   });
-  if (pending.k) {
-    const std::ptrdiff_t k = pending.k, kk = k * step;
-    const V w = pending.w, negated = Neg(w);
-    group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
-    group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
-          c_half + kk);
+  if (pending.k) CombineFour<V, kForward>(a, h, pending.k, pending.w, c, nc);
+}
+
+// The last radix-4 pass (length h, one butterfly a column) and Combine in
+// one sweep, for a W of two V and h >= 64, with the arithmetic of both.
+// With q = h/4, the columns c and q - c of the pass give the elements that
+// Combine takes for its groups c and q - c, with their mates. So the
+// columns (c, c + 1) for odd c and their mirrors (q - c - 1, q - c) go from
+// the butterflies to Combine's groups c, c + 1, q - c - 1 and q - c without
+// a round through memory. The columns 0 and q/2 - 1 .. q/2 + 1 and their
+// groups are left over and done one at a time.
+template <typename V, typename W, bool kForward>
+void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
+  const int h = n >> 2, q = h >> 2;
+  const std::ptrdiff_t im = 2 * h, s = h / 2, step = nc / h;
+  const double* const t = w_end - h / 2;
+  const double* const tw = w_end - h;
+  const double* const c = w_end;
+  const double* const c_half = c + nc / 2;
+  // Combine's groups k and k + 1 from the pass outputs x (places px) and
+  // y (places py) in memory order, twiddles w^k and w^(k+1) in `both`.
+  const auto combine = [&](std::ptrdiff_t k, W both, double* up, Complex2<W> at_up, double* down,
+                           Complex2<W> at_down, double* mid_down, Complex2<W> at_mid_down,
+                           double* mid_up, Complex2<W> at_mid_up) {
+    const W negated = Neg(both);
+    const std::ptrdiff_t kk = k * step;
+    CombinePairOf<W, kForward, 1, -1>(
+        up, down, im, at_up, at_down, UnpackLow(both, negated), DupHigh(both),
+        Join(Make<V>(c[kk], c[nc - kk]), Make<V>(c[kk + step], c[nc - kk - step])));
+    CombinePairOf<W, kForward, -1, 1>(
+        mid_down, mid_up, im, at_mid_down, at_mid_up, UnpackHigh(both, negated), DupLow(both),
+        Join(Make<V>(c_half[-kk], c_half[kk]), Make<V>(c_half[-kk - step], c_half[kk + step])));
+  };
+  const auto column_pair = [&](double* p, W w1, W w3, bool mirror) {
+    Quarters<W> out;
+    ColumnTurns(w1, w3, mirror, [&](auto t2, auto t1, auto t3) {
+      out = Radix4Values<W>(Get<W>(p, im), Get<W>(p + s, im), Get<W>(p + 2 * s, im),
+                            Get<W>(p + 3 * s, im), t2, t1, t3);
+    });
+    return out;
+  };
+  // Twiddles as ForEachTwiddle makes them: odd k from the even ones on
+  // either side, the pass's upwards from k = 1 and Combine's both ways.
+  const V odd1 = Splat<V>(t[2]), odd3 = Splat<V>(t[3]), odd_w = Splat<V>(tw[2]);
+  V below1 = Make<V>(1, 0), below3 = below1, below_w = below1;
+  V above_w = Splat<V>(tw[1]);
+  for (int k = 1; k + 3 <= q / 2; k += 2) {
+    const V even1 = Load<V>(t + 2 * k + 2), even3 = Load<V>(t + 2 * k + 4);
+    const V w1 = (below1 + even1) * odd1, w3 = (below3 + even3) * odd3;
+    below1 = even1;
+    below3 = even3;
+    // Columns k, k + 1 at x and their mirrors q - k - 1, q - k at y.
+    double* const x = a + 2 * k;
+    double* const y = a + s - 2 * k - 2;
+    const Quarters<W> low = column_pair(x, Join(w1, even1), Join(w3, even3), false);
+    const Quarters<W> high = column_pair(y, Join(even1, w1), Join(even3, w3), true);
+    const V even_w = Load<V>(tw + 2 * k + 2);
+    const V w = (below_w + even_w) * odd_w;
+    below_w = even_w;
+    // Combine's k is the column's; q - k - 1 is even, q - k odd.
+    const std::ptrdiff_t m = q - k - 1;
+    const V mirror_even = Load<V>(tw + 2 * m);
+    const V mirror_odd = (mirror_even + above_w) * odd_w;
+    above_w = mirror_even;
+    combine(k, Join(w, even_w), x, low.x[0], y + 3 * s, high.x[3], y + s, high.x[1], x + 2 * s,
+            low.x[2]);
+    combine(m, Join(mirror_even, mirror_odd), y, high.x[0], x + 3 * s, low.x[3], x + s,
+            low.x[1], y + 2 * s, high.x[2]);
   }
-  if (h >= 4) {
-    const V c4 = Splat<V>(kC4);
-    group(a + h / 2, a + im - h / 2, c4 * Make<V>(1, -1), c4, c + nc / 4, c_end - nc / 4);
+  // The columns left over, one lane pair each: 0, q/2 and the pair
+  // q/2 - 1, q/2 + 1 of one twiddle.
+  const int last = q / 2 - 1;
+  {
+    V w1, w3;
+    TwiddleAt<V>(h, t, last, &w1, &w3);
+    Radix4<V>(a, s, im, Unturned(), Unturned(), Unturned());
+    Radix4<V>(a + 2 * (q / 2), s, im, TurnI(), TurnEighth(), TurnThreeEighths());
+    ColumnTurns(w1, w3, false, [&](auto t2, auto t1, auto t3) {
+      Radix4<V>(a + 2 * last, s, im, t2, t1, t3);
+    });
+    ColumnTurns(w1, w3, true, [&](auto t2, auto t1, auto t3) {
+      Radix4<V>(a + 2 * (q - last), s, im, t2, t1, t3);
+    });
   }
-  group(a + h, a + h, Make<V>(0, -0.0), Splat<V>(1), c_half, c_half);
+  CombineFixed<V, kForward>(a, h, c, nc);
+  for (int k = last; k <= q / 2 + 1; ++k) {
+    V w, unused;
+    TwiddleAt<V>(2 * h, tw, k, &w, &unused);
+    CombineFour<V, kForward>(a, h, k, w, c, nc);
+  }
 }
 
 // Backward split step, in place on the packed spectrum, on the same groups
@@ -194,6 +306,13 @@ void SplitBackward(int n, double* a, const double* c, int nc) {
 // exp(-...) backward.
 template <typename V, typename W, bool kForward>
 void ComplexStage(int n, double* data, const double* w_end, int nc) {
+  if constexpr (!std::is_same_v<V, W>) {
+    if (n >= 256) {
+      LaneTransform<V, W, !kForward, false>(n, data, w_end);
+      LastPassAndCombine<V, W, kForward>(n, data, w_end, nc);
+      return;
+    }
+  }
   LaneTransform<V, W, !kForward>(n, data, w_end);
   Combine<V, W, kForward>(n, data, w_end - (n >> 2), w_end, nc);
 }
