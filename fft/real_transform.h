@@ -86,12 +86,13 @@ inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c
 }
 
 // One group of Combine on its own: the places x and y, w^k = (wr, wi)
-// with the second lane of wr negated, and the split weights at ck and cm.
+// with the second lane of wr negated, and the pair of split weights at
+// `weights`.
 template <typename V, bool kForward>
-inline void CombineOne(double* x, double* y, std::ptrdiff_t im, V wr, V wi, const double* ck,
-                       const double* cm) {
-  const CombinedGroup<V> out = CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi,
-                                                         Make<V>(*ck, *cm), Make<V>(*cm, *ck));
+inline void CombineOne(double* x, double* y, std::ptrdiff_t im, V wr, V wi, const double* weights) {
+  const V c_km = Load<V>(weights);
+  const CombinedGroup<V> out =
+      CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi, c_km, Swap(c_km));
   Store(x, out.at_x);
   Store(y, out.at_y);
   Store(x + im, out.at_x_im);
@@ -104,9 +105,9 @@ inline void CombineFour(double* a, int h, std::ptrdiff_t k, V w, const double* c
   const std::ptrdiff_t im = 2 * h, kk = k * (nc / h);
   const V negated = Neg(w);
   CombineOne<V, kForward>(a + 2 * k, a + im - 2 * k, im, UnpackLow(w, negated), DupHigh(w),
-                          c + kk, c + nc - kk);
+                          c + 2 * kk);
   CombineOne<V, kForward>(a + h - 2 * k, a + h + 2 * k, im, UnpackHigh(w, negated), DupLow(w),
-                          c + nc / 2 - kk, c + nc / 2 + kk);
+                          c + nc - 2 * kk);
 }
 
 // Combine's element 0 and the groups h/4 and h/2, which pair with
@@ -122,11 +123,9 @@ inline void CombineFixed(double* a, int h, const double* c, int nc) {
   Store(a + im, (even - odd) * sign);
   if (h >= 4) {
     const V c4 = Splat<V>(kC4);
-    CombineOne<V, kForward>(a + h / 2, a + im - h / 2, im, c4 * Make<V>(1, -1), c4, c + nc / 4,
-                            c + nc - nc / 4);
+    CombineOne<V, kForward>(a + h / 2, a + im - h / 2, im, c4 * Make<V>(1, -1), c4, c + nc / 2);
   }
-  CombineOne<V, kForward>(a + h, a + h, im, Make<V>(0, -0.0), Splat<V>(1), c + nc / 2,
-                          c + nc / 2);
+  CombineOne<V, kForward>(a + h, a + h, im, Make<V>(0, -0.0), Splat<V>(1), c);
 }
 
 // Last complex stage over the whole lane layout, back to (re, im) pairs in
@@ -140,8 +139,6 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   const std::ptrdiff_t step = nc / h;
-  const double* const c_end = c + nc;
-  const double* const c_half = c + nc / 2;
   CombineFixed<V, kForward>(a, h, c, nc);
   // Group h/2 - k takes w^(h/2 - k) = i conj(w^k). With W wider than V,
   // groups k and k + 1 run together for odd k.
@@ -157,10 +154,8 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   double* down = a + im - 2;
   double* mid_down = a + h - 2;
   double* mid_up = a + h + 2;
-  const double* c_up = c + step;
-  const double* c_down = c_end - step;
-  const double* half_down = c_half - step;
-  const double* half_up = c_half + step;
+  const double* weights_up = c + 2 * step;
+  const double* weights_mid = c + nc - 2 * step;
   ForEachTwiddle<V>(2 * h, tw, [&](std::ptrdiff_t k, V w, V) {
     if constexpr (!std::is_same_v<V, W>) {
       if (k % 2) {
@@ -171,18 +166,16 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
       const W both = Join(pending.w, w), negated = Neg(both);
       CombinePair<W, kForward, 1, -1>(
           up, down, im, UnpackLow(both, negated), DupHigh(both),
-          Join(Make<V>(c_up[0], c_down[0]), Make<V>(c_up[step], c_down[-step])));
+          Join(Load<V>(weights_up), Load<V>(weights_up + 2 * step)));
       CombinePair<W, kForward, -1, 1>(
           mid_down, mid_up, im, UnpackHigh(both, negated), DupLow(both),
-          Join(Make<V>(half_down[0], half_up[0]), Make<V>(half_down[-step], half_up[step])));
+          Join(Load<V>(weights_mid), Load<V>(weights_mid - 2 * step)));
       up += 4;
       down -= 4;
       mid_down -= 4;
       mid_up += 4;
-      c_up += 2 * step;
-      c_down -= 2 * step;
-      half_down -= 2 * step;
-      half_up += 2 * step;
+      weights_up += 4 * step;
+      weights_mid -= 4 * step;
       return;
     }
     CombineFour<V, kForward>(a, h, k, w, c, nc);
@@ -205,7 +198,6 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
   const double* const t = w_end - h / 2;
   const double* const tw = w_end - h;
   const double* const c = w_end;
-  const double* const c_half = c + nc / 2;
   // Combine's groups k and k + 1 from the pass outputs x (places px) and
   // y (places py) in memory order, twiddles w^k and w^(k+1) in `both`.
   const auto combine = [&](std::ptrdiff_t k, W both, double* up, Complex2<W> at_up, double* down,
@@ -213,12 +205,12 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
                            double* mid_up, Complex2<W> at_mid_up) {
     const W negated = Neg(both);
     const std::ptrdiff_t kk = k * step;
-    CombinePairOf<W, kForward, 1, -1>(
-        up, down, im, at_up, at_down, UnpackLow(both, negated), DupHigh(both),
-        Join(Make<V>(c[kk], c[nc - kk]), Make<V>(c[kk + step], c[nc - kk - step])));
+    CombinePairOf<W, kForward, 1, -1>(up, down, im, at_up, at_down, UnpackLow(both, negated),
+                                      DupHigh(both),
+                                      Join(Load<V>(c + 2 * kk), Load<V>(c + 2 * (kk + step))));
     CombinePairOf<W, kForward, -1, 1>(
         mid_down, mid_up, im, at_mid_down, at_mid_up, UnpackHigh(both, negated), DupLow(both),
-        Join(Make<V>(c_half[-kk], c_half[kk]), Make<V>(c_half[-kk - step], c_half[kk + step])));
+        Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk + step))));
   };
   const auto column_pair = [&](double* p, W w1, W w3, bool mirror) {
     Quarters<W> out;
@@ -292,9 +284,9 @@ void SplitBackward(int n, double* a, const double* c, int nc) {
     const V xk = Load<V>(x), xm = Load<V>(y), yk = Load<V>(y + im), ym = Load<V>(x + im);
     Complex2<V> low = {UnpackLow(xk, xm), UnpackHigh(xk, xm)};
     Complex2<V> high = {UnpackLow(yk, ym), UnpackHigh(yk, ym)};
-    const double* const ck = c + k * step;
-    const double* const cm = c + nc - k * step;
-    SplitBins<V, true>(&low, &high, Splat<V>(0.5) - Make<V>(*cm, *ck), Make<V>(*ck, *cm));
+    // Bin h/2 takes the pair kept at the start.
+    const V c_km = Load<V>(2 * k == h ? c : c + 2 * k * step);
+    SplitBins<V, true>(&low, &high, Splat<V>(0.5) - Swap(c_km), c_km);
     Store(x, UnpackLow(low.re, low.im));
     Store(y, UnpackHigh(low.re, low.im));
     Store(y + im, UnpackLow(high.re, high.im));
