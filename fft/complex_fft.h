@@ -215,9 +215,15 @@ inline Quarters<V> Radix4Values(Complex2<V> a, Complex2<V> b, Complex2<V> c, Com
 // The same at element p of a block whose quarters are s doubles apart.
 template <typename V, typename T2, typename T1, typename T3>
 inline void Radix4(double* p, std::ptrdiff_t s, std::ptrdiff_t im, T2 turn2, T1 turn1, T3 turn3) {
-  const Quarters<V> out = Radix4Values<V>(Get<V>(p, im), Get<V>(p + s, im), Get<V>(p + 2 * s, im),
-                                          Get<V>(p + 3 * s, im), turn2, turn1, turn3);
-  for (int m = 0; m < 4; ++m) Put(p + m * s, im, out.x[m]);
+  const Complex2<V> a = Get<V>(p, im);
+  const Complex2<V> b = turn2(Get<V>(p + s, im));
+  const Complex2<V> c = turn1(Get<V>(p + 2 * s, im));
+  const Complex2<V> d = turn3(Get<V>(p + 3 * s, im));
+  const Complex2<V> t0 = a + b, t1 = a - b, u = c + d, v = c - d;
+  Put(p, im, t0 + u);
+  Put(p + s, im, PlusI(t1, v));
+  Put(p + 2 * s, im, t0 - u);
+  Put(p + 3 * s, im, MinusI(t1, v));
 }
 
 // The butterflies at one index of every block, p running to end in steps.
@@ -252,13 +258,16 @@ void Radix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t
   const std::ptrdiff_t s = length / 2, step = 2 * length;
   const double* const end = a + 2 * h;
   Radix4Column<V>(a, end, step, s, im, Unturned(), Unturned(), Unturned());
+  // w^(q - k) = i conj(w^k), w^2(q - k) = -conj(w^2k), w^3(q - k) = -i conj(w^3k).
   ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
-    ColumnTurns(w1, w3, false, [&](auto t2, auto t1, auto t3) {
-      Radix4Column<V>(a + 2 * k, end, step, s, im, t2, t1, t3);
-    });
-    ColumnTurns(w1, w3, true, [&](auto t2, auto t1, auto t3) {
-      Radix4Column<V>(a + s - 2 * k, end, step, s, im, t2, t1, t3);
-    });
+    const V c1 = DupLow(w1), s1 = DupHigh(w1);
+    V c2, s2;
+    SquareParts(c1, s1, &c2, &s2);
+    const V c3 = DupLow(w3), s3 = DupHigh(w3);
+    Radix4Column<V>(a + 2 * k, end, step, s, im, Turn<V>{c2, s2}, Turn<V>{c1, s1},
+                    TurnConj<V>{c3, s3});
+    Radix4Column<V>(a + s - 2 * k, end, step, s, im, Turn<V>{Neg(c2), s2}, Turn<V>{s1, c1},
+                    TurnConj<V>{s3, c3});
   });
   Radix4Column<V>(a + s / 2, end, step, s, im, TurnI(), TurnEighth(), TurnThreeEighths());
 }

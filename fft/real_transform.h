@@ -101,8 +101,9 @@ inline void CombineOne(double* x, double* y, std::ptrdiff_t im, V wr, V wi, cons
 
 // The groups k, h - k, h/2 - k and h/2 + k of Combine, twiddle w = w^k.
 template <typename V, bool kForward>
-inline void CombineFour(double* a, int h, std::ptrdiff_t k, V w, const double* c, int nc) {
-  const std::ptrdiff_t im = 2 * h, kk = k * (nc / h);
+inline void CombineFour(double* a, int h, std::ptrdiff_t k, V w, const double* c, int nc,
+                        std::ptrdiff_t step) {
+  const std::ptrdiff_t im = 2 * h, kk = k * step;
   const V negated = Neg(w);
   CombineOne<V, kForward>(a + 2 * k, a + im - 2 * k, im, UnpackLow(w, negated), DupHigh(w),
                           c + 2 * kk);
@@ -178,9 +179,9 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
       weights_mid -= 4 * step;
       return;
     }
-    CombineFour<V, kForward>(a, h, k, w, c, nc);
+    CombineFour<V, kForward>(a, h, k, w, c, nc, step);
   });
-  if (pending.k) CombineFour<V, kForward>(a, h, pending.k, pending.w, c, nc);
+  if (pending.k) CombineFour<V, kForward>(a, h, pending.k, pending.w, c, nc, step);
 }
 
 // The last radix-4 pass (length h, one butterfly a column) and Combine in
@@ -267,7 +268,7 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
   for (int k = last; k <= q / 2 + 1; ++k) {
     V w, unused;
     TwiddleAt<V>(2 * h, tw, k, &w, &unused);
-    CombineFour<V, kForward>(a, h, k, w, c, nc);
+    CombineFour<V, kForward>(a, h, k, w, c, nc, step);
   }
 }
 
