@@ -213,13 +213,9 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
         mid_down, mid_up, im, at_mid_down, at_mid_up, UnpackHigh(both, negated), DupLow(both),
         Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk + step))));
   };
-  const auto column_pair = [&](double* p, W w1, W w3, bool mirror) {
-    Quarters<W> out;
-    ColumnTurns(w1, w3, mirror, [&](auto t2, auto t1, auto t3) {
-      out = Radix4Values<W>(Get<W>(p, im), Get<W>(p + s, im), Get<W>(p + 2 * s, im),
-                            Get<W>(p + 3 * s, im), t2, t1, t3);
-    });
-    return out;
+  const auto column_pair = [&](double* p, auto turn2, auto turn1, auto turn3) {
+    return Radix4Values<W>(Get<W>(p, im), Get<W>(p + s, im), Get<W>(p + 2 * s, im),
+                           Get<W>(p + 3 * s, im), turn2, turn1, turn3);
   };
   // Twiddles as ForEachTwiddle makes them: odd k from the even ones on
   // either side, the pass's upwards from k = 1 and Combine's both ways.
@@ -234,8 +230,18 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
     // Columns k, k + 1 at x and their mirrors q - k - 1, q - k at y.
     double* const x = a + 2 * k;
     double* const y = a + s - 2 * k - 2;
-    const Quarters<W> low = column_pair(x, Join(w1, even1), Join(w3, even3), false);
-    const Quarters<W> high = column_pair(y, Join(even1, w1), Join(even3, w3), true);
+    // The mirrors take the halves of the columns' parts the other way round
+    // (see ColumnTurns).
+    const W both1 = Join(w1, even1), both3 = Join(w3, even3);
+    const W c1 = DupLow(both1), s1 = DupHigh(both1), c3 = DupLow(both3), s3 = DupHigh(both3);
+    W c2, s2;
+    SquareParts(c1, s1, &c2, &s2);
+    const Quarters<W> low =
+        column_pair(x, Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
+    const W c1m = SwapHalves(c1), s1m = SwapHalves(s1), c2m = SwapHalves(c2);
+    const W s2m = SwapHalves(s2), c3m = SwapHalves(c3), s3m = SwapHalves(s3);
+    const Quarters<W> high =
+        column_pair(y, Turn<W>{Neg(c2m), s2m}, Turn<W>{s1m, c1m}, TurnConj<W>{s3m, c3m});
     const V even_w = Load<V>(tw + 2 * k + 2);
     const V w = (below_w + even_w) * odd_w;
     below_w = even_w;
