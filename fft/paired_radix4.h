@@ -34,11 +34,12 @@ SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
 }
 
 // The radix-2 stage of FirstStages and the radix-4 pass of length 8, done
-// on each block of eight in registers with the same arithmetic. Block B starts from element R = reverse(B) and its
-// pairs of positions (0, 1) .. (6, 7) come from the elements R, R + h/4,
-// R + h/8 and R + 3h/8, each with the one h/2 on. The blocks with R from
-// 4g to 4g + 3 form group g, which reads what group reverse(g) writes;
-// one group of each pair goes through a buffer.
+// on each block of eight in registers with the same arithmetic. Block B
+// starts from element R = reverse(B), and its pairs of positions (0, 1) ..
+// (6, 7) come from the elements R, R + h/4, R + h/8 and R + 3h/8, each
+// with the one h/2 on. The blocks with R from 4g to 4g + 3 form group g,
+// which reads what group reverse(g) writes; one group of each pair goes
+// through a buffer.
 template <typename V, typename W>
 void FirstStagesOfEight(int n, double* a) {
   const int h = n >> 2;
@@ -107,39 +108,27 @@ __attribute__((flatten)) void PairedRadix4Pass(int length, double* a, std::ptrdi
     return;
   }
   // Turns of two columns, one per half.
-  const auto turns = [](W w1, W w3, bool mirror, auto f) { ColumnTurns(w1, w3, mirror, f); };
-  const auto pass = [&](auto column) {
-    V previous1 = Splat<V>(0), previous3 = previous1;
-    ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
-      if (k == 1) {
-        turns(Join(w1, w1), Join(w3, w3), false, [&](auto t2, auto t1, auto t3) {
-          column(a, Split(Unturned(), t2), Split(Unturned(), t1), Split(Unturned(), t3));
-        });
-      } else if (k % 2) {
-        turns(Join(previous1, w1), Join(previous3, w3), false,
-              [&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
-      } else {
-        turns(Join(w1, previous1), Join(w3, previous3), true,
-              [&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
-      }
-      previous1 = w1;
-      previous3 = w3;
-    });
-    turns(Join(previous1, previous1), Join(previous3, previous3), true,
-          [&](auto t2, auto t1, auto t3) {
-            column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1),
-                   Split(TurnThreeEighths(), t3));
-          });
-  };
-  // In the last pass a column is one butterfly, without a loop to keep
-  // the twiddles in registers across.
-  if (length == h) {
-    pass([&](double* p, auto turn2, auto turn1, auto turn3) {
-      Radix4<W>(p, s, im, turn2, turn1, turn3);
-    });
-  } else {
-    pass(column);
-  }
+  V previous1 = Splat<V>(0), previous3 = previous1;
+  ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
+    if (k == 1) {
+      ColumnTurns(Join(w1, w1), Join(w3, w3), false, [&](auto t2, auto t1, auto t3) {
+        column(a, Split(Unturned(), t2), Split(Unturned(), t1), Split(Unturned(), t3));
+      });
+    } else if (k % 2) {
+      ColumnTurns(Join(previous1, w1), Join(previous3, w3), false,
+                  [&](auto t2, auto t1, auto t3) { column(a + 2 * (k - 1), t2, t1, t3); });
+    } else {
+      ColumnTurns(Join(w1, previous1), Join(w3, previous3), true,
+                  [&](auto t2, auto t1, auto t3) { column(a + s - 2 * k, t2, t1, t3); });
+    }
+    previous1 = w1;
+    previous3 = w3;
+  });
+  ColumnTurns(Join(previous1, previous1), Join(previous3, previous3), true,
+              [&](auto t2, auto t1, auto t3) {
+                column(a + s / 2, Split(TurnI(), t2), Split(TurnEighth(), t1),
+                       Split(TurnThreeEighths(), t3));
+              });
 }
 
 }  // namespace CLIPWEAVER_ISA
