@@ -61,28 +61,32 @@ inline CombinedGroup<V> CombineGroup(Complex2<V> xk, Complex2<V> xm, V wr, V wi,
           UnpackHigh(high.re, high.im)};
 }
 
-// Groups k and k + 1 side by side in W, for the places x and y of group k;
-// the places of group k + 1 lie above (+) or below (-) them. The twiddles
-// and the weights c_km come as W already, one group per half. at_px and
-// at_py hold what lies at the W-wide places px and py.
+// Two groups side by side in W, in xk and xm as CombineGroup takes them,
+// with their twiddles and weights c_km one per half. Their places px and py
+// hold them in that order (+) or with the halves exchanged (-).
 template <typename W, bool kForward, int kXDirection, int kYDirection>
-inline void CombinePairOf(double* px, double* py, std::ptrdiff_t im, Complex2<W> at_px,
-                          Complex2<W> at_py, W wr, W wi, W c_km) {
+inline void CombinePairOf(double* px, double* py, std::ptrdiff_t im, Complex2<W> xk,
+                          Complex2<W> xm, W wr, W wi, W c_km) {
   const auto in_order = [](W v, int direction) { return direction > 0 ? v : SwapHalves(v); };
-  const Complex2<W> xk = {in_order(at_px.re, kXDirection), in_order(at_px.im, kXDirection)};
-  const Complex2<W> xm = {in_order(at_py.re, kYDirection), in_order(at_py.im, kYDirection)};
   const CombinedGroup<W> out = CombineGroup<W, kForward>(xk, xm, wr, wi, c_km, Swap(c_km));
   Store(px, in_order(out.at_x, kXDirection));
   Store(py, in_order(out.at_y, kYDirection));
   Store(px + im, in_order(out.at_x_im, kXDirection));
   Store(py + im, in_order(out.at_y_im, kYDirection));
 }
+
+// Groups k and k + 1 side by side in W, for the places x and y of group k;
+// the places of group k + 1 lie above (+) or below (-) them.
 template <typename W, bool kForward, int kXDirection, int kYDirection>
 inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c_km) {
   double* const px = kXDirection > 0 ? x : x - 2;
   double* const py = kYDirection > 0 ? y : y - 2;
-  CombinePairOf<W, kForward, kXDirection, kYDirection>(px, py, im, Get<W>(px, im), Get<W>(py, im),
-                                                       wr, wi, c_km);
+  const auto get = [&](double* p, int direction) {
+    const Complex2<W> v = Get<W>(p, im);
+    return direction > 0 ? v : Complex2<W>{SwapHalves(v.re), SwapHalves(v.im)};
+  };
+  CombinePairOf<W, kForward, kXDirection, kYDirection>(px, py, im, get(px, kXDirection),
+                                                       get(py, kYDirection), wr, wi, c_km);
 }
 
 // One group of Combine on its own: the places x and y, w^k = (wr, wi)
@@ -199,23 +203,15 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
   const double* const t = w_end - h / 2;
   const double* const tw = w_end - h;
   const double* const c = w_end;
-  // Combine's groups k and k + 1 from the pass outputs x (places px) and
-  // y (places py) in memory order, twiddles w^k and w^(k+1) in `both`.
-  const auto combine = [&](std::ptrdiff_t k, W both, double* up, Complex2<W> at_up, double* down,
-                           Complex2<W> at_down, double* mid_down, Complex2<W> at_mid_down,
-                           double* mid_up, Complex2<W> at_mid_up) {
-    const W negated = Neg(both);
-    const std::ptrdiff_t kk = k * step;
-    CombinePairOf<W, kForward, 1, -1>(up, down, im, at_up, at_down, UnpackLow(both, negated),
-                                      DupHigh(both),
-                                      Join(Load<V>(c + 2 * kk), Load<V>(c + 2 * (kk + step))));
-    CombinePairOf<W, kForward, -1, 1>(
-        mid_down, mid_up, im, at_mid_down, at_mid_up, UnpackHigh(both, negated), DupLow(both),
-        Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk + step))));
-  };
-  const auto column_pair = [&](double* p, auto turn2, auto turn1, auto turn3) {
-    return Radix4Values<W>(Get<W>(p, im), Get<W>(p + s, im), Get<W>(p + 2 * s, im),
-                           Get<W>(p + 3 * s, im), turn2, turn1, turn3);
+  // The mirrors are read with the halves exchanged, which puts them in
+  // the order of their twiddles and of Combine's groups.
+  const auto column_pair = [&](double* p, bool exchange, auto turn2, auto turn1, auto turn3) {
+    const auto get = [&](double* at) {
+      const Complex2<W> v = Get<W>(at, im);
+      return exchange ? Complex2<W>{SwapHalves(v.re), SwapHalves(v.im)} : v;
+    };
+    return Radix4Values<W>(get(p), get(p + s), get(p + 2 * s), get(p + 3 * s), turn2, turn1,
+                           turn3);
   };
   // Twiddles as ForEachTwiddle makes them: odd k from the even ones on
   // either side, the pass's upwards from k = 1 and Combine's both ways.
@@ -230,30 +226,43 @@ void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
     // Columns k, k + 1 at x and their mirrors q - k - 1, q - k at y.
     double* const x = a + 2 * k;
     double* const y = a + s - 2 * k - 2;
-    // The mirrors take the halves of the columns' parts the other way round
-    // (see ColumnTurns).
     const W both1 = Join(w1, even1), both3 = Join(w3, even3);
     const W c1 = DupLow(both1), s1 = DupHigh(both1), c3 = DupLow(both3), s3 = DupHigh(both3);
     W c2, s2;
     SquareParts(c1, s1, &c2, &s2);
+    // low holds the columns k, k + 1 and high the mirrors q - k, q - k - 1.
     const Quarters<W> low =
-        column_pair(x, Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
-    const W c1m = SwapHalves(c1), s1m = SwapHalves(s1), c2m = SwapHalves(c2);
-    const W s2m = SwapHalves(s2), c3m = SwapHalves(c3), s3m = SwapHalves(s3);
+        column_pair(x, false, Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
     const Quarters<W> high =
-        column_pair(y, Turn<W>{Neg(c2m), s2m}, Turn<W>{s1m, c1m}, TurnConj<W>{s3m, c3m});
+        column_pair(y, true, Turn<W>{Neg(c2), s2}, Turn<W>{s1, c1}, TurnConj<W>{s3, c3});
     const V even_w = Load<V>(tw + 2 * k + 2);
     const V w = (below_w + even_w) * odd_w;
     below_w = even_w;
-    // Combine's k is the column's; q - k - 1 is even, q - k odd.
-    const std::ptrdiff_t m = q - k - 1;
-    const V mirror_even = Load<V>(tw + 2 * m);
+    {
+      // Combine's groups k, k + 1.
+      const W both = Join(w, even_w), negated = Neg(both);
+      const std::ptrdiff_t kk = k * step;
+      CombinePairOf<W, kForward, 1, -1>(x, y + 3 * s, im, low.x[0], high.x[3],
+                                        UnpackLow(both, negated), DupHigh(both),
+                                        Join(Load<V>(c + 2 * kk), Load<V>(c + 2 * (kk + step))));
+      CombinePairOf<W, kForward, -1, 1>(
+          y + s, x + 2 * s, im, high.x[1], low.x[2], UnpackHigh(both, negated), DupLow(both),
+          Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk + step))));
+    }
+    // Combine's groups q - k (odd) and q - k - 1 (even).
+    const V mirror_even = Load<V>(tw + 2 * (q - k - 1));
     const V mirror_odd = (mirror_even + above_w) * odd_w;
     above_w = mirror_even;
-    combine(k, Join(w, even_w), x, low.x[0], y + 3 * s, high.x[3], y + s, high.x[1], x + 2 * s,
-            low.x[2]);
-    combine(m, Join(mirror_even, mirror_odd), y, high.x[0], x + 3 * s, low.x[3], x + s,
-            low.x[1], y + 2 * s, high.x[2]);
+    {
+      const W both = Join(mirror_odd, mirror_even), negated = Neg(both);
+      const std::ptrdiff_t kk = (q - k) * step;
+      CombinePairOf<W, kForward, -1, 1>(y, x + 3 * s, im, high.x[0], low.x[3],
+                                        UnpackLow(both, negated), DupHigh(both),
+                                        Join(Load<V>(c + 2 * kk), Load<V>(c + 2 * (kk - step))));
+      CombinePairOf<W, kForward, 1, -1>(
+          x + s, y + 2 * s, im, low.x[1], high.x[2], UnpackHigh(both, negated), DupLow(both),
+          Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk - step))));
+    }
   }
   // The columns left over, one lane pair each: 0, q/2 and the pair
   // q/2 - 1, q/2 + 1 of one twiddle.
