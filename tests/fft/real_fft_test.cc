@@ -97,15 +97,22 @@ TEST(RealFft, MatchesDirectTransformInvertsAndGivesThePlainBitsOnEveryPath) {
     for (int k = 0; k < n; ++k) ASSERT_NEAR(data[k] * 2 / n, x[k], 1e-13) << k;
     for (int k = n; k < n + kGuardCount; ++k) ASSERT_EQ(data[k], kGuard);
     ASSERT_TRUE(space.GuardsIntact());
-    for (size_t path = 0; path < paths.size(); ++path) {
-      for (int direction : {1, -1}) {
-        std::vector<double> actual = Noise(n, 5 * n);
-        std::vector<double> plain = actual;
-        paths[path](n, direction, actual.data(), space.work.data(), space.table.data());
-        fft_internal::RealTransform<fft_internal::PlainDouble2>(
-            n, direction, plain.data(), space.work.data(), space.table.data());
-        ASSERT_EQ(std::memcmp(actual.data(), plain.data(), n * sizeof(double)), 0)
-            << "path " << path << ", direction " << direction;
+    // Also with tables built for a longer transform, as shorter lengths
+    // take them.
+    Workspace longer(4 * n);
+    longer.Run(4 * n, 1, Noise(4 * n, 1).data());
+    for (const Workspace* tables : {&space, &longer}) {
+      for (size_t path = 0; path < paths.size(); ++path) {
+        for (int direction : {1, -1}) {
+          std::vector<double> actual = Noise(n, 5 * n);
+          std::vector<double> plain = actual;
+          paths[path](n, direction, actual.data(), tables->work.data(), tables->table.data());
+          fft_internal::RealTransform<fft_internal::PlainDouble2>(
+              n, direction, plain.data(), tables->work.data(), tables->table.data());
+          ASSERT_EQ(std::memcmp(actual.data(), plain.data(), n * sizeof(double)), 0)
+              << "path " << path << ", direction " << direction << ", tables "
+              << tables->table_size;
+        }
       }
     }
   }
