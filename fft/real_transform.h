@@ -189,7 +189,7 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
 }
 
 // The last radix-4 pass (length h, one butterfly a column) and Combine in
-// one sweep, for a W of two V and h >= 64, with the arithmetic of both.
+// one sweep, for a W of two V and 64 <= h <= 512, with the arithmetic of both.
 // With q = h/4, the columns c and q - c of the pass give the elements that
 // Combine takes for its groups c and q - c, with their mates. So the
 // columns (c, c + 1) for odd c and their mirrors (q - c - 1, q - c) go from
