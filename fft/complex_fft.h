@@ -195,9 +195,24 @@ void FirstStages(int n, double* a) {
   }
 }
 
-// Radix-4 butterfly of decimation in time at element p of a block whose
-// quarters are s doubles apart. The quarters hold the transforms of the
-// points 0, 2, 1 and 3 mod 4 (bit-reversed order), each after its turn.
+// Radix-4 butterfly of decimation in time on the quarters a, b, c, d of a
+// block, which hold the transforms of the points 0, 2, 1 and 3 mod 4
+// (bit-reversed order), each before its turn; returns the new quarters.
+template <typename V>
+struct Quarters {
+  Complex2<V> x[4];
+};
+template <typename V, typename T2, typename T1, typename T3>
+inline Quarters<V> Radix4Values(Complex2<V> a, Complex2<V> b, Complex2<V> c, Complex2<V> d,
+                                T2 turn2, T1 turn1, T3 turn3) {
+  b = turn2(b);
+  c = turn1(c);
+  d = turn3(d);
+  const Complex2<V> t0 = a + b, t1 = a - b, u = c + d, v = c - d;
+  return {{t0 + u, PlusI(t1, v), t0 - u, MinusI(t1, v)}};
+}
+
+// The same at element p of a block whose quarters are s doubles apart.
 template <typename V, typename T2, typename T1, typename T3>
 inline void Radix4(double* p, std::ptrdiff_t s, std::ptrdiff_t im, T2 turn2, T1 turn1, T3 turn3) {
   const Complex2<V> a = Get<V>(p, im);
@@ -218,6 +233,23 @@ inline void Radix4Column(double* p, const double* end, std::ptrdiff_t step, std:
   for (; p < end; p += step) Radix4<V>(p, s, im, turn2, turn1, turn3);
 }
 
+// Calls f(turn2, turn1, turn3) with the turns of the column k of a radix-4
+// pass, from w1 = w^k and w3 = conj(w^3k) in each half of V, or with those
+// of its mirror q - k: w^(q - k) = i conj(w^k), w^2(q - k) = -conj(w^2k),
+// w^3(q - k) = -i conj(w^3k).
+template <typename V, typename F>
+inline void ColumnTurns(V w1, V w3, bool mirror, F f) {
+  const V c1 = DupLow(w1), s1 = DupHigh(w1);
+  V c2, s2;
+  SquareParts(c1, s1, &c2, &s2);
+  const V c3 = DupLow(w3), s3 = DupHigh(w3);
+  if (mirror) {
+    f(Turn<V>{Neg(c2), s2}, Turn<V>{s1, c1}, TurnConj<V>{s3, c3});
+  } else {
+    f(Turn<V>{c2, s2}, Turn<V>{c1, s1}, TurnConj<V>{c3, s3});
+  }
+}
+
 // One radix-4 pass over blocks of `length` elements, q = length/4
 // butterflies each, twiddles from the sub-table t. Each twiddle is worked
 // out once for all blocks.
@@ -228,9 +260,9 @@ void Radix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t
   Radix4Column<V>(a, end, step, s, im, Unturned(), Unturned(), Unturned());
   // w^(q - k) = i conj(w^k), w^2(q - k) = -conj(w^2k), w^3(q - k) = -i conj(w^3k).
   ForEachTwiddle<V>(length, t, [&](int k, V w1, V w3) {
-    const V w2 = Square(w1);
     const V c1 = DupLow(w1), s1 = DupHigh(w1);
-    const V c2 = DupLow(w2), s2 = DupHigh(w2);
+    V c2, s2;
+    SquareParts(c1, s1, &c2, &s2);
     const V c3 = DupLow(w3), s3 = DupHigh(w3);
     Radix4Column<V>(a + 2 * k, end, step, s, im, Turn<V>{c2, s2}, Turn<V>{c1, s1},
                     TurnConj<V>{c3, s3});
@@ -256,16 +288,31 @@ inline void SecondStage4(double* p, std::ptrdiff_t im) {
 template <typename V, typename W>
 void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t);
 
+// The first three stages forward in blocks of eight (paired_radix4.h), for
+// a W that holds two V and h = n/4 an odd power of two from 32 on.
+template <typename V, typename W>
+void FirstStagesOfEight(int n, double* a);
+
 // The complex stage up to its last stage, forward (exp(+...)) or on the
 // conjugated input: a decimation in time of the h = n/4 elements from
 // bit-reversed order to natural order, taking one or two first stages so
 // that radix 4 does the rest; w_end points behind the twiddle region. The
 // radix-4 passes run over W, two elements at a time, where W is wider than V.
-template <typename V, typename W, bool kConj>
+// With kLastPass false the last pass, of length h, is left to the caller.
+template <typename V, typename W, bool kConj, bool kLastPass = true>
 void LaneTransform(int n, double* a, const double* w_end) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int length = 16;
+  if constexpr (!kConj && !std::is_same_v<V, W>) {
+    if (n >= 128 && !(n & 0x55555555)) {
+      FirstStagesOfEight<V, W>(n, a);
+      for (length = 32; kLastPass ? length <= h : length < h; length *= 4) {
+        PairedRadix4Pass<V, W>(length, a, im, h, w_end - length / 2);
+      }
+      return;
+    }
+  }
   if (n >= 64 && (n & 0x55555555)) {
     FirstStages<V, V, kConj, 2>(n, a);
   } else {
@@ -276,7 +323,7 @@ void LaneTransform(int n, double* a, const double* w_end) {
       length = 8;
     }
   }
-  for (; length <= h; length *= 4) {
+  for (; kLastPass ? length <= h : length < h; length *= 4) {
     if constexpr (std::is_same_v<V, W>) {
       Radix4Pass<V>(length, a, im, h, w_end - length / 2);
     } else {

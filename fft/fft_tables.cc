@@ -56,11 +56,10 @@ void BuildCosineRegion(int nc, double* c) {
   if (nc <= 1) return;
   const int h = nc >> 1;
   const double delta = kQuarterPi / h;
-  c[0] = std::cos(kQuarterPi);
-  c[h] = 0.5 * c[0];
+  c[0] = c[1] = 0.5 * std::cos(kQuarterPi);
   for (int j = 1; j < h; ++j) {
-    c[j] = 0.5 * std::cos(j * delta);
-    c[nc - j] = 0.5 * std::sin(j * delta);
+    c[2 * j] = 0.5 * std::cos(j * delta);
+    c[2 * j + 1] = 0.5 * std::sin(j * delta);
   }
 }
 

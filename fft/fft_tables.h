@@ -17,9 +17,10 @@
 // The odd twiddles are midpoints of the even ones scaled by [2] and [3];
 // those past an eighth of the circle follow by symmetry.
 //
-// The cosine region holds c[0] = cos(pi/4), c[nc/2] = c[0] / 2 and, for
-// 0 < j < nc/2, c[j] = cos(j d) / 2, c[nc - j] = sin(j d) / 2 with
-// d = pi / (2 nc).
+// The cosine region holds pairs, so that one load takes both weights of a
+// bin: c[2j] = cos(j d) / 2, c[2j + 1] = sin(j d) / 2 for 0 < j < nc/2,
+// with d = pi / (2 nc), and the pair for j = nc/2, cos(pi/4) / 2 twice, in
+// c[0] and c[1].
 #ifndef CLIPWEAVER_FFT_FFT_TABLES_H_
 #define CLIPWEAVER_FFT_FFT_TABLES_H_
 

@@ -61,21 +61,76 @@ inline CombinedGroup<V> CombineGroup(Complex2<V> xk, Complex2<V> xm, V wr, V wi,
           UnpackHigh(high.re, high.im)};
 }
 
-// Groups k and k + 1 side by side in W, for the places x and y of group k;
-// the places of group k + 1 lie above (+) or below (-) them. The twiddles
-// and the weights c_km come as W already, one group per half.
+// Two groups side by side in W, in xk and xm as CombineGroup takes them,
+// with their twiddles and weights c_km one per half. Their places px and py
+// hold them in that order (+) or with the halves exchanged (-).
 template <typename W, bool kForward, int kXDirection, int kYDirection>
-inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c_km) {
-  double* const px = kXDirection > 0 ? x : x - 2;
-  double* const py = kYDirection > 0 ? y : y - 2;
+inline void CombinePairOf(double* px, double* py, std::ptrdiff_t im, Complex2<W> xk,
+                          Complex2<W> xm, W wr, W wi, W c_km) {
   const auto in_order = [](W v, int direction) { return direction > 0 ? v : SwapHalves(v); };
-  const Complex2<W> xk = {in_order(Load<W>(px), kXDirection), in_order(Load<W>(px + im), kXDirection)};
-  const Complex2<W> xm = {in_order(Load<W>(py), kYDirection), in_order(Load<W>(py + im), kYDirection)};
   const CombinedGroup<W> out = CombineGroup<W, kForward>(xk, xm, wr, wi, c_km, Swap(c_km));
   Store(px, in_order(out.at_x, kXDirection));
   Store(py, in_order(out.at_y, kYDirection));
   Store(px + im, in_order(out.at_x_im, kXDirection));
   Store(py + im, in_order(out.at_y_im, kYDirection));
+}
+
+// Groups k and k + 1 side by side in W, for the places x and y of group k;
+// the places of group k + 1 lie above (+) or below (-) them.
+template <typename W, bool kForward, int kXDirection, int kYDirection>
+inline void CombinePair(double* x, double* y, std::ptrdiff_t im, W wr, W wi, W c_km) {
+  double* const px = kXDirection > 0 ? x : x - 2;
+  double* const py = kYDirection > 0 ? y : y - 2;
+  const auto get = [&](double* p, int direction) {
+    const Complex2<W> v = Get<W>(p, im);
+    return direction > 0 ? v : Complex2<W>{SwapHalves(v.re), SwapHalves(v.im)};
+  };
+  CombinePairOf<W, kForward, kXDirection, kYDirection>(px, py, im, get(px, kXDirection),
+                                                       get(py, kYDirection), wr, wi, c_km);
+}
+
+// One group of Combine on its own: the places x and y, w^k = (wr, wi)
+// with the second lane of wr negated, and the pair of split weights at
+// `weights`.
+template <typename V, bool kForward>
+inline void CombineOne(double* x, double* y, std::ptrdiff_t im, V wr, V wi, const double* weights) {
+  const V c_km = Load<V>(weights);
+  const CombinedGroup<V> out =
+      CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi, c_km, Swap(c_km));
+  Store(x, out.at_x);
+  Store(y, out.at_y);
+  Store(x + im, out.at_x_im);
+  Store(y + im, out.at_y_im);
+}
+
+// The groups k, h - k, h/2 - k and h/2 + k of Combine, twiddle w = w^k.
+template <typename V, bool kForward>
+inline void CombineFour(double* a, int h, std::ptrdiff_t k, V w, const double* c, int nc,
+                        std::ptrdiff_t step) {
+  const std::ptrdiff_t im = 2 * h, kk = k * step;
+  const V negated = Neg(w);
+  CombineOne<V, kForward>(a + 2 * k, a + im - 2 * k, im, UnpackLow(w, negated), DupHigh(w),
+                          c + 2 * kk);
+  CombineOne<V, kForward>(a + h - 2 * k, a + h + 2 * k, im, UnpackHigh(w, negated), DupLow(w),
+                          c + nc - 2 * kk);
+}
+
+// Combine's element 0 and the groups h/4 and h/2, which pair with
+// themselves or take fixed twiddles.
+template <typename V, bool kForward>
+inline void CombineFixed(double* a, int h, const double* c, int nc) {
+  const std::ptrdiff_t im = 2 * h;
+  // Element 0 gives X[0] = E[0] + O[0] and X[h] = E[0] - O[0].
+  const V sign = Make<V>(1, kForward ? 1 : -1);
+  const V re = Load<V>(a), im0 = Load<V>(a + im);
+  const V even = UnpackLow(re, im0), odd = UnpackHigh(re, im0);
+  Store(a, (even + odd) * sign);
+  Store(a + im, (even - odd) * sign);
+  if (h >= 4) {
+    const V c4 = Splat<V>(kC4);
+    CombineOne<V, kForward>(a + h / 2, a + im - h / 2, im, c4 * Make<V>(1, -1), c4, c + nc / 2);
+  }
+  CombineOne<V, kForward>(a + h, a + h, im, Make<V>(0, -0.0), Splat<V>(1), c);
 }
 
 // Last complex stage over the whole lane layout, back to (re, im) pairs in
@@ -89,22 +144,7 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   const std::ptrdiff_t step = nc / h;
-  const double* const c_end = c + nc;
-  const double* const c_half = c + nc / 2;
-  auto group = [&](double* x, double* y, V wr, V wi, const double* ck, const double* cm) {
-    const CombinedGroup<V> out = CombineGroup<V, kForward>(Get<V>(x, im), Get<V>(y, im), wr, wi,
-                                                           Make<V>(*ck, *cm), Make<V>(*cm, *ck));
-    Store(x, out.at_x);
-    Store(y, out.at_y);
-    Store(x + im, out.at_x_im);
-    Store(y + im, out.at_y_im);
-  };
-  // Element 0 gives X[0] = E[0] + O[0] and X[h] = E[0] - O[0].
-  const V sign = Make<V>(1, kForward ? 1 : -1);
-  const V re = Load<V>(a), im0 = Load<V>(a + im);
-  const V even = UnpackLow(re, im0), odd = UnpackHigh(re, im0);
-  Store(a, (even + odd) * sign);
-  Store(a + im, (even - odd) * sign);
+  CombineFixed<V, kForward>(a, h, c, nc);
   // Group h/2 - k takes w^(h/2 - k) = i conj(w^k). With W wider than V,
   // groups k and k + 1 run together for odd k.
   struct Twiddles {
@@ -119,10 +159,8 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
   double* down = a + im - 2;
   double* mid_down = a + h - 2;
   double* mid_up = a + h + 2;
-  const double* c_up = c + step;
-  const double* c_down = c_end - step;
-  const double* half_down = c_half - step;
-  const double* half_up = c_half + step;
+  const double* weights_up = c + 2 * step;
+  const double* weights_mid = c + nc - 2 * step;
   ForEachTwiddle<V>(2 * h, tw, [&](std::ptrdiff_t k, V w, V) {
     if constexpr (!std::is_same_v<V, W>) {
       if (k % 2) {
@@ -133,38 +171,120 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
       const W both = Join(pending.w, w), negated = Neg(both);
       CombinePair<W, kForward, 1, -1>(
           up, down, im, UnpackLow(both, negated), DupHigh(both),
-          Join(Make<V>(c_up[0], c_down[0]), Make<V>(c_up[step], c_down[-step])));
+          Join(Load<V>(weights_up), Load<V>(weights_up + 2 * step)));
       CombinePair<W, kForward, -1, 1>(
           mid_down, mid_up, im, UnpackHigh(both, negated), DupLow(both),
-          Join(Make<V>(half_down[0], half_up[0]), Make<V>(half_down[-step], half_up[step])));
+          Join(Load<V>(weights_mid), Load<V>(weights_mid - 2 * step)));
       up += 4;
       down -= 4;
       mid_down -= 4;
       mid_up += 4;
-      c_up += 2 * step;
-      c_down -= 2 * step;
-      half_down -= 2 * step;
-      half_up += 2 * step;
+      weights_up += 4 * step;
+      weights_mid -= 4 * step;
       return;
     }
-    const V negated = Neg(w);
-    const std::ptrdiff_t kk = k * step;
-    group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
-    group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
-          c_half + kk);
+    CombineFour<V, kForward>(a, h, k, w, c, nc, step);
   });
-  if (pending.k) {
-    const std::ptrdiff_t k = pending.k, kk = k * step;
-    const V w = pending.w, negated = Neg(w);
-    group(a + 2 * k, a + im - 2 * k, UnpackLow(w, negated), DupHigh(w), c + kk, c_end - kk);
-    group(a + h - 2 * k, a + h + 2 * k, UnpackHigh(w, negated), DupLow(w), c_half - kk,
-          c_half + kk);
+  if (pending.k) CombineFour<V, kForward>(a, h, pending.k, pending.w, c, nc, step);
+}
+
+// The last radix-4 pass (length h, one butterfly a column) and Combine in
+// one sweep, for a W of two V and 64 <= h <= 512, with the arithmetic of both.
+// With q = h/4, the columns c and q - c of the pass give the elements that
+// Combine takes for its groups c and q - c, with their mates. So the
+// columns (c, c + 1) for odd c and their mirrors (q - c - 1, q - c) go from
+// the butterflies to Combine's groups c, c + 1, q - c - 1 and q - c without
+// a round through memory. The columns 0 and q/2 - 1 .. q/2 + 1 and their
+// groups are left over and done one at a time.
+template <typename V, typename W, bool kForward>
+void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
+  const int h = n >> 2, q = h >> 2;
+  const std::ptrdiff_t im = 2 * h, s = h / 2, step = nc / h;
+  const double* const t = w_end - h / 2;
+  const double* const tw = w_end - h;
+  const double* const c = w_end;
+  // The mirrors are read with the halves exchanged, which puts them in
+  // the order of their twiddles and of Combine's groups.
+  const auto column_pair = [&](double* p, bool exchange, auto turn2, auto turn1, auto turn3) {
+    const auto get = [&](double* at) {
+      const Complex2<W> v = Get<W>(at, im);
+      return exchange ? Complex2<W>{SwapHalves(v.re), SwapHalves(v.im)} : v;
+    };
+    return Radix4Values<W>(get(p), get(p + s), get(p + 2 * s), get(p + 3 * s), turn2, turn1,
+                           turn3);
+  };
+  // Twiddles as ForEachTwiddle makes them: odd k from the even ones on
+  // either side, the pass's upwards from k = 1 and Combine's both ways.
+  const V odd1 = Splat<V>(t[2]), odd3 = Splat<V>(t[3]), odd_w = Splat<V>(tw[2]);
+  V below1 = Make<V>(1, 0), below3 = below1, below_w = below1;
+  V above_w = Splat<V>(tw[1]);
+  for (int k = 1; k + 3 <= q / 2; k += 2) {
+    const V even1 = Load<V>(t + 2 * k + 2), even3 = Load<V>(t + 2 * k + 4);
+    const V w1 = (below1 + even1) * odd1, w3 = (below3 + even3) * odd3;
+    below1 = even1;
+    below3 = even3;
+    // Columns k, k + 1 at x and their mirrors q - k - 1, q - k at y.
+    double* const x = a + 2 * k;
+    double* const y = a + s - 2 * k - 2;
+    const W both1 = Join(w1, even1), both3 = Join(w3, even3);
+    const W c1 = DupLow(both1), s1 = DupHigh(both1), c3 = DupLow(both3), s3 = DupHigh(both3);
+    W c2, s2;
+    SquareParts(c1, s1, &c2, &s2);
+    // low holds the columns k, k + 1 and high the mirrors q - k, q - k - 1.
+    const Quarters<W> low =
+        column_pair(x, false, Turn<W>{c2, s2}, Turn<W>{c1, s1}, TurnConj<W>{c3, s3});
+    const Quarters<W> high =
+        column_pair(y, true, Turn<W>{Neg(c2), s2}, Turn<W>{s1, c1}, TurnConj<W>{s3, c3});
+    const V even_w = Load<V>(tw + 2 * k + 2);
+    const V w = (below_w + even_w) * odd_w;
+    below_w = even_w;
+    {
+      // Combine's groups k, k + 1.
+      const W both = Join(w, even_w), negated = Neg(both);
+      const std::ptrdiff_t kk = k * step;
+      CombinePairOf<W, kForward, 1, -1>(x, y + 3 * s, im, low.x[0], high.x[3],
+                                        UnpackLow(both, negated), DupHigh(both),
+                                        Join(Load<V>(c + 2 * kk), Load<V>(c + 2 * (kk + step))));
+      CombinePairOf<W, kForward, -1, 1>(
+          y + s, x + 2 * s, im, high.x[1], low.x[2], UnpackHigh(both, negated), DupLow(both),
+          Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk + step))));
+    }
+    // Combine's groups q - k (odd) and q - k - 1 (even).
+    const V mirror_even = Load<V>(tw + 2 * (q - k - 1));
+    const V mirror_odd = (mirror_even + above_w) * odd_w;
+    above_w = mirror_even;
+    {
+      const W both = Join(mirror_odd, mirror_even), negated = Neg(both);
+      const std::ptrdiff_t kk = (q - k) * step;
+      CombinePairOf<W, kForward, -1, 1>(y, x + 3 * s, im, high.x[0], low.x[3],
+                                        UnpackLow(both, negated), DupHigh(both),
+                                        Join(Load<V>(c + 2 * kk), Load<V>(c + 2 * (kk - step))));
+      CombinePairOf<W, kForward, 1, -1>(
+          x + s, y + 2 * s, im, low.x[1], high.x[2], UnpackHigh(both, negated), DupLow(both),
+          Join(Load<V>(c + nc - 2 * kk), Load<V>(c + nc - 2 * (kk - step))));
+    }
   }
-  if (h >= 4) {
-    const V c4 = Splat<V>(kC4);
-    group(a + h / 2, a + im - h / 2, c4 * Make<V>(1, -1), c4, c + nc / 4, c_end - nc / 4);
+  // The columns left over, one lane pair each: 0, q/2 and the pair
+  // q/2 - 1, q/2 + 1 of one twiddle.
+  const int last = q / 2 - 1;
+  {
+    V w1, w3;
+    TwiddleAt<V>(h, t, last, &w1, &w3);
+    Radix4<V>(a, s, im, Unturned(), Unturned(), Unturned());
+    Radix4<V>(a + 2 * (q / 2), s, im, TurnI(), TurnEighth(), TurnThreeEighths());
+    ColumnTurns(w1, w3, false, [&](auto t2, auto t1, auto t3) {
+      Radix4<V>(a + 2 * last, s, im, t2, t1, t3);
+    });
+    ColumnTurns(w1, w3, true, [&](auto t2, auto t1, auto t3) {
+      Radix4<V>(a + 2 * (q - last), s, im, t2, t1, t3);
+    });
   }
-  group(a + h, a + h, Make<V>(0, -0.0), Splat<V>(1), c_half, c_half);
+  CombineFixed<V, kForward>(a, h, c, nc);
+  for (int k = last; k <= q / 2 + 1; ++k) {
+    V w, unused;
+    TwiddleAt<V>(2 * h, tw, k, &w, &unused);
+    CombineFour<V, kForward>(a, h, k, w, c, nc, step);
+  }
 }
 
 // Backward split step, in place on the packed spectrum, on the same groups
@@ -180,9 +300,9 @@ void SplitBackward(int n, double* a, const double* c, int nc) {
     const V xk = Load<V>(x), xm = Load<V>(y), yk = Load<V>(y + im), ym = Load<V>(x + im);
     Complex2<V> low = {UnpackLow(xk, xm), UnpackHigh(xk, xm)};
     Complex2<V> high = {UnpackLow(yk, ym), UnpackHigh(yk, ym)};
-    const double* const ck = c + k * step;
-    const double* const cm = c + nc - k * step;
-    SplitBins<V, true>(&low, &high, Splat<V>(0.5) - Make<V>(*cm, *ck), Make<V>(*ck, *cm));
+    // Bin h/2 takes the pair kept at the start.
+    const V c_km = Load<V>(2 * k == h ? c : c + 2 * k * step);
+    SplitBins<V, true>(&low, &high, Splat<V>(0.5) - Swap(c_km), c_km);
     Store(x, UnpackLow(low.re, low.im));
     Store(y, UnpackHigh(low.re, low.im));
     Store(y + im, UnpackLow(high.re, high.im));
@@ -194,6 +314,16 @@ void SplitBackward(int n, double* a, const double* c, int nc) {
 // exp(-...) backward.
 template <typename V, typename W, bool kForward>
 void ComplexStage(int n, double* data, const double* w_end, int nc) {
+  if constexpr (!std::is_same_v<V, W>) {
+    // From n = 4096 on the sweep ran slower than the two passes apart:
+    // there the quarters of a column lie 4 KB or more apart, in one cache
+    // set.
+    if (n >= 256 && n <= 2048) {
+      LaneTransform<V, W, !kForward, false>(n, data, w_end);
+      LastPassAndCombine<V, W, kForward>(n, data, w_end, nc);
+      return;
+    }
+  }
   LaneTransform<V, W, !kForward>(n, data, w_end);
   Combine<V, W, kForward>(n, data, w_end - (n >> 2), w_end, nc);
 }

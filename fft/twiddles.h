@@ -40,6 +40,24 @@ inline void ForEachTwiddle(int length, const double* t, F f) {
   f(j / 2 - 1, (w1 + Splat<V>(t[1])) * odd1, (w3 + Splat<V>(-t[1])) * odd3);
 }
 
+// The w1 and w3 that ForEachTwiddle gives for one k, worked out the same
+// way; length >= 32.
+template <typename V>
+inline void TwiddleAt(int length, const double* t, int k, V* w1, V* w3) {
+  if (k % 2 == 0) {
+    *w1 = Load<V>(t + 2 * k);
+    *w3 = Load<V>(t + 2 * k + 2);
+    return;
+  }
+  const bool first = k == 1, last = k + 1 == length / 8;
+  const V below1 = first ? Make<V>(1, 0) : Load<V>(t + 2 * k - 2);
+  const V below3 = first ? Make<V>(1, 0) : Load<V>(t + 2 * k);
+  const V above1 = last ? Splat<V>(t[1]) : Load<V>(t + 2 * k + 2);
+  const V above3 = last ? Splat<V>(-t[1]) : Load<V>(t + 2 * k + 4);
+  *w1 = (below1 + above1) * Splat<V>(t[2]);
+  *w3 = (below3 + above3) * Splat<V>(t[3]);
+}
+
 // Turns: multiplications by a twiddle, as butterflies apply them to their inputs.
 struct Unturned {
   template <typename V>
@@ -81,12 +99,12 @@ struct TurnI {
   }
 };
 
-// w^2 for w = (re, im) in one V.
+// The real and imaginary parts of w^2 from those of w, each in both lanes.
 template <typename V>
-inline V Square(V w) {
-  const V squares = w * w;
-  const V products = w * Swap(w);
-  return UnpackLow(squares, products) + UnpackHigh(Neg(squares), products);
+inline void SquareParts(V c, V s, V* c2, V* s2) {
+  *c2 = c * c - s * s;
+  const V product = c * s;
+  *s2 = product + product;
 }
 
 }  // namespace CLIPWEAVER_ISA
