@@ -60,8 +60,8 @@ class TransitionScorer {
     bool crowded;
   };
 
-  void Keep(const BeamEntries& entries, bool ascending);
-  template <typename Index>
+  void Keep(const BeamEntries& entries, bool ascending, bool spaced);
+  template <bool kMayCrowd, typename Index>
   void KeepInOrder(const BeamEntries& entries, Index index);
   void FindLeader();
   void Limit(double key, int32_t* first, int32_t* last) const;
@@ -100,6 +100,7 @@ class TransitionScorer {
   std::vector<int32_t> order_;
   std::vector<Kept> kept_;
   int32_t kept_count_ = 0;
+  std::vector<uint8_t> close_;
   // Positions in kept_ by phase class, largest base first within a class;
   // class q takes by_class_[class_start_[q] .. class_start_[q + 1]).
   std::vector<int32_t> by_class_;
