@@ -188,6 +188,14 @@ class Apm {
   std::vector<std::vector<int32_t>> changed_;
   // The current frame modulo every lag.
   std::vector<int32_t> frame_phase_;
+  // What the per-frame steps look up of a state, side by side.
+  struct StateShape {
+    int32_t lag_index;
+    int32_t lag;
+    int32_t half;
+    int32_t phase;
+  };
+  std::vector<StateShape> shape_;
   // The states with a given predecessor, as lists linked through the
   // states: so the states orphaned by the beam are found without a scan.
   std::vector<int32_t> first_child_;
