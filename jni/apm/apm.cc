@@ -165,7 +165,9 @@ bool Apm::SetUpStates() {
 
 // The search's tables and scratch, sized once for the model.
 void Apm::SetUpSearch() {
-  values_.Reset(value_count_, state_count_, kUnreached);
+  // A frame reads one row and writes the next: two hold every read.
+  row_count_ = std::min(value_count_, 2);
+  values_.Reset(row_count_, state_count_, kUnreached);
   observation_.assign(state_count_, kUnreached);
   comb_.Reset(lag_frames_,
               apmtime_count_ > max_lag_ ? max_lag_ + 1 : apmtime_count_,
@@ -191,14 +193,13 @@ void Apm::SetUpSearch() {
   transition_.SetUp(lag_count_, max_lag_, period_change_score_,
                     phase_deviation_score_);
   frame_phase_.assign(lag_count_, 0);
-  // The per-frame steps read a state's lag index, lag, half lag and phase
-  // together: one line of memory rather than four.
+  // Read together by the per-frame steps: one line of memory, not four.
   shape_.resize(state_count_);
   for (int32_t s = 0; s < state_count_; ++s) {
     const int32_t lag = state_lag_[s];
     shape_[s] = {lag - min_lag_, lag, lag / 2, state_phase_[s]};
   }
-  changed_.assign(value_count_, {});
+  changed_.assign(row_count_, {});
   first_child_.assign(state_count_, -1);
   next_sibling_.assign(state_count_, -1);
   previous_sibling_.assign(state_count_, -1);
@@ -216,8 +217,7 @@ void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
     observation_[candidates_[i]] = comb_out_[i];
   }
   // The beam entries as the scoring takes them; on the way, the states
-  // that lead on from this frame are stamped live, which the walk of the
-  // orphan lists below reads.
+  // that lead on from this frame are stamped live for the orphan walk.
   const double* values = values_.row(cur);
   const double bonus = config_.beat_bonus;
   for (int32_t k = 0; k < active; ++k) {
@@ -247,17 +247,17 @@ void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
   // The candidates are scored afresh.
   double* next_values = values_.row(next);
   if (next != cur) CatchUpRow(t, values, next_values);
-  changed_[t % value_count_] = candidates_;
+  changed_[t % row_count_] = candidates_;
   for (int32_t c : candidates_) next_values[c] = kUnreached;
 }
 
 // Row next is behind row cur by the candidates of the frames since it was
 // last written; copying just those is usually far less than the whole row.
 void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
-  const int32_t frames = std::min(value_count_ - 1, t);
+  const int32_t frames = std::min(row_count_ - 1, t);
   size_t behind = 0;
   for (int32_t back = 1; back <= frames; ++back) {
-    behind += changed_[(t - back) % value_count_].size();
+    behind += changed_[(t - back) % row_count_].size();
   }
   // A scattered copy costs several times a streamed one per state: from an
   // eighth of the row on, copying the whole row is the cheaper.
@@ -266,7 +266,7 @@ void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
     return;
   }
   for (int32_t back = 1; back <= frames; ++back) {
-    for (int32_t s : changed_[(t - back) % value_count_]) {
+    for (int32_t s : changed_[(t - back) % row_count_]) {
       next_values[s] = values[s];
     }
   }
@@ -281,8 +281,8 @@ void Apm::Run(std::function<bool(float)> progress) {
                 << static_cast<float>(t) / frames_per_second_ << " sec";
       if (progress && progress(static_cast<float>(t) / time_count_)) return;
     }
-    const int32_t cur = t % value_count_;
-    const int32_t next = (t + 1) % value_count_;
+    const int32_t cur = t % row_count_;
+    const int32_t next = (t + 1) % row_count_;
     comb_out_ = comb_.Filter(detection_, t);
     PrepareStep(t, cur, next, active);
     Transition(cur, next, active);
@@ -403,7 +403,7 @@ void Apm::Backtrack() {
 int32_t Apm::BestFinalState() const {
   // Below any value a row holds, kUnreached included.
   constexpr double kBelowEveryValue = -10000000.0;
-  const double* last = values_.row(time_count_ % value_count_);
+  const double* last = values_.row(time_count_ % row_count_);
   int32_t state = 0;
   double best = kBelowEveryValue;
   for (int32_t s = 0; s < state_count_; ++s) {
