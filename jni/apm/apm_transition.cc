@@ -326,8 +326,19 @@ void TransitionScorer::ScoreFar(const double* observation, const double* prior,
     int32_t first = 0;
     int32_t last = lag_count_ - 1;
     Limit(top.base + phase, &first, &last);
-    for (int32_t j = first; j <= last; ++j) {
-      // Most lags are far from the class's top entry.
+    // Most lags are far from the class's top entry, and the top is rarely
+    // crowded: those lags need neither the walk nor the tie check.
+    const int32_t near_first = top.crowded ? first : top.lag - period_tail_ + 1;
+    const int32_t near_last = top.crowded ? last : top.lag + period_tail_ - 1;
+    const auto far_run = [&](int32_t begin, int32_t end) {
+      for (int32_t j = begin; j <= end; ++j) {
+        const double x = ((observation[j] + tail) + phase) + prior[j];
+        Offer(top.base + x, top.entry, &best[j], &from[j]);
+      }
+    };
+    far_run(first, std::min(last, near_first - 1));
+    for (int32_t j = std::max(first, near_first); j <= std::min(last, near_last);
+         ++j) {
       int32_t i = 0;
       if (std::abs(top.lag - j) < period_tail_) {
         for (i = 1;
@@ -347,6 +358,7 @@ void TransitionScorer::ScoreFar(const double* observation, const double* prior,
         }
       }
     }
+    far_run(std::max(first, near_last + 1), last);
   }
 }
 
