@@ -108,6 +108,7 @@ void TransitionScorer::SetUp(int32_t lag_count, int32_t offset_range,
                              const std::vector<double>& phase_deviation_score) {
   lag_count_ = lag_count;
   offset_range_ = offset_range;
+  avx_ = instruction_set::HasAvx();
   period_ = period_change_score;
   phase_ = phase_deviation_score;
   period_by_difference_ = ByDifference(period_, lag_count - 1);
@@ -173,7 +174,7 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
   const double* period = period_by_difference_.data() + lag_count_ - 1 - lag;
   const double* phase = phase_by_difference_.data() + offset_range_ - offset;
 #if defined(__x86_64__)
-  if (instruction_set::HasAvx()) {
+  if (avx_) {
     ScoreStateAvx(entries.base, entries.lag, entries.offset, entries.count,
                   period, phase, observation, prior, best, from);
     return;
@@ -300,12 +301,13 @@ void TransitionScorer::ScoreNear(const double* observation, const double* prior,
   for (int32_t i = 0; i < kept_count_; ++i) {
     const Kept& k = kept_[i];
     const double phase = phase_[k.phase_class];
+    const double* period = period_by_difference_.data() + lag_count_ - 1 - k.lag;
     int32_t first = std::max(0, k.lag - period_tail_ + 1);
     int32_t last = std::min(lag_count_ - 1, k.lag + period_tail_ - 1);
     Limit(k.base + phase + period_gain_, &first, &last);
     for (int32_t j = first; j <= last; ++j) {
       const double score =
-          k.base + (((observation[j] + period_[std::abs(j - k.lag)]) + phase) +
+          k.base + (((observation[j] + period[j]) + phase) +
                     prior[j]);
       Offer(score, k.entry, &best[j], &from[j]);
     }

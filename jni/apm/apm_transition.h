@@ -88,6 +88,8 @@ class TransitionScorer {
   double period_gain_ = 0.0;
   bool near_at_least_tail_ = false;
   bool usable_ = false;
+  // Read once: ScoreState runs for every orphan.
+  bool avx_ = false;
 
   // Per call: how close two bases must be to possibly tie, how much the
   // rounding of a score can change comparisons of keys, and the leader.
