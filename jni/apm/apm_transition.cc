@@ -62,25 +62,24 @@ bool Bounded(const double* v, size_t n, double* max_abs) {
 
 // Bounded for the bases of a beam of count >= 1 entries, telling on the
 // way whether they ascend (the beam's usual order, which Keep takes as it
-// is then) and, if so, the least step between neighbours.
+// is then) and, if so, the least step between neighbours. Ascending bases
+// lie between the first and the last, which bound them all.
 bool BoundedBases(const double* base, int32_t count, double* max_abs,
                   bool* ascending, double* least_step) {
-  double largest = std::abs(base[0]);
-  bool within = largest <= kLargest;
   bool up = true;
   double step = std::numeric_limits<double>::infinity();
   for (int32_t k = 1; k < count; ++k) {
-    const double a = std::abs(base[k]);
-    within &= a <= kLargest;
-    largest = std::max(largest, a);
     const double d = base[k] - base[k - 1];
     up &= d >= 0.0;
     step = std::min(step, d);
   }
-  *max_abs = largest;
   *ascending = up;
   *least_step = step;
-  return within;
+  if (up) {
+    *max_abs = std::max(std::abs(base[0]), std::abs(base[count - 1]));
+    return *max_abs <= kLargest;
+  }
+  return Bounded(base, count, max_abs);
 }
 
 // In any order of offers this keeps the first entry with the largest
