@@ -137,7 +137,7 @@ class Apm {
   int32_t time_count_ = 0;
   int32_t state_count_ = 0;
   int32_t value_count_ = 0;
-  // Rows of the ring kept: value_count_, or 2 if that is less.
+  // Rows of the ring kept: 2, or value_count_ if that is less.
   int32_t row_count_ = 0;
   int32_t apmtime_count_ = 0;
   int32_t min_lag_ = 0;

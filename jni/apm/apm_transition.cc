@@ -197,7 +197,8 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
 
 // Entries by descending base. The beam comes out of the selection in
 // ascending order of value, so this is usually a reversal, taken without
-// an index table.
+// an index table; spaced (no two bases within delta) then too, so that no
+// entry is crowded.
 void TransitionScorer::Keep(const BeamEntries& entries, bool ascending,
                             bool spaced) {
   const int32_t count = entries.count;
@@ -305,9 +306,7 @@ void TransitionScorer::ScoreNear(const double* observation, const double* prior,
     int32_t last = std::min(lag_count_ - 1, k.lag + period_tail_ - 1);
     Limit(k.base + phase + period_gain_, &first, &last);
     for (int32_t j = first; j <= last; ++j) {
-      const double score =
-          k.base + (((observation[j] + period[j]) + phase) +
-                    prior[j]);
+      const double score = k.base + (((observation[j] + period[j]) + phase) + prior[j]);
       Offer(score, k.entry, &best[j], &from[j]);
     }
   }

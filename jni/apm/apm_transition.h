@@ -102,6 +102,7 @@ class TransitionScorer {
   std::vector<int32_t> order_;
   std::vector<Kept> kept_;
   int32_t kept_count_ = 0;
+  // KeepInOrder's scratch: which neighbours by base are within delta.
   std::vector<uint8_t> close_;
   // Positions in kept_ by phase class, largest base first within a class;
   // class q takes by_class_[class_start_[q] .. class_start_[q + 1]).
