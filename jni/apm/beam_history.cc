@@ -58,9 +58,11 @@ void BeamHistory::Append(const int32_t* beam, const int32_t* predecessor) {
 bool BeamHistory::Follow(int32_t t, int32_t* state) {
   const uint16_t* row = states(t);
   int32_t s = *state;
-  int32_t k = 0;
-  while (k < width_ && row[k] != s) ++k;
-  const bool found = k < width_;
+  // From the end, where a row keeps its best states and the path mostly
+  // runs; a row holds a state once, so this finds the same entry.
+  int32_t k = width_ - 1;
+  while (k >= 0 && row[k] != s) --k;
+  const bool found = k >= 0;
   if (!found) {
     k = width_ - 1;
     if (s == -1) s = row[k];
