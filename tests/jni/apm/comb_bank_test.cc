@@ -17,7 +17,7 @@ float Expected(double y) { return static_cast<float>(std::exp(std::log(y))); }
 bool SameBits(float a, float b) { return std::memcmp(&a, &b, sizeof(a)) == 0; }
 
 // The shortcut must round as exp(log(y)) does, above all where y lies
-// a few ulps from halfway between two floats, the one place they part.
+// a few ulps from halfway between two floats, the one place they differ.
 TEST(CombBank, FloatOfExpRoundsAsExpOfLog) {
   const float floats[] = {1e-5f, 0.1f, 0.75f, 1.0f, 1.5f, 3.0f, 1000.0f};
   // In ulps of the double, up to the float's own half spacing.
