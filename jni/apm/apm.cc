@@ -165,7 +165,9 @@ bool Apm::SetUpStates() {
 
 // The search's tables and scratch, sized once for the model.
 void Apm::SetUpSearch() {
-  values_.Reset(value_count_, state_count_, kUnreached);
+  // A frame reads one row and writes the next: two hold every read.
+  row_count_ = std::min(value_count_, 2);
+  values_.Reset(row_count_, state_count_, kUnreached);
   observation_.assign(state_count_, kUnreached);
   comb_.Reset(lag_frames_,
               apmtime_count_ > max_lag_ ? max_lag_ + 1 : apmtime_count_,
@@ -191,7 +193,13 @@ void Apm::SetUpSearch() {
   transition_.SetUp(lag_count_, max_lag_, period_change_score_,
                     phase_deviation_score_);
   frame_phase_.assign(lag_count_, 0);
-  changed_.assign(value_count_, {});
+  // Read together by the per-frame steps: one line of memory, not four.
+  shape_.resize(state_count_);
+  for (int32_t s = 0; s < state_count_; ++s) {
+    const int32_t lag = state_lag_[s];
+    shape_[s] = {lag - min_lag_, lag, lag / 2, state_phase_[s]};
+  }
+  changed_.assign(row_count_, {});
   first_child_.assign(state_count_, -1);
   next_sibling_.assign(state_count_, -1);
   previous_sibling_.assign(state_count_, -1);
@@ -208,9 +216,17 @@ void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
     candidates_[i] = lag_first_state_[i] + frame_phase_[i];
     observation_[candidates_[i]] = comb_out_[i];
   }
+  // The beam entries as the scoring takes them; on the way, the states
+  // that lead on from this frame are stamped live for the orphan walk.
   const double* values = values_.row(cur);
+  const double bonus = config_.beat_bonus;
   for (int32_t k = 0; k < active; ++k) {
-    if (values[beam_[k]] != kUnreached) live_stamp_[beam_[k]] = t;
+    const int32_t f = beam_[k];
+    const bool reached = values[f] != kUnreached;
+    if (reached) live_stamp_[f] = t;
+    entry_base_[k] = bonus + (reached ? values[f] : 0.0);
+    entry_lag_[k] = shape_[f].lag_index;
+    entry_offset_[k] = Offset(f);
   }
   size_t kept = 0;
   for (const int32_t parent : parents_) {
@@ -221,7 +237,7 @@ void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
     parents_[kept++] = parent;
     if (live_stamp_[parent] == t) continue;
     for (int32_t s = first_child_[parent]; s != -1; s = next_sibling_[s]) {
-      if (state_phase_[s] != frame_phase_[state_lag_[s] - min_lag_]) {
+      if (shape_[s].phase != frame_phase_[shape_[s].lag_index]) {
         candidates_.push_back(s);
       }
     }
@@ -231,17 +247,17 @@ void Apm::PrepareStep(int32_t t, int32_t cur, int32_t next, int32_t active) {
   // The candidates are scored afresh.
   double* next_values = values_.row(next);
   if (next != cur) CatchUpRow(t, values, next_values);
-  changed_[t % value_count_] = candidates_;
+  changed_[t % row_count_] = candidates_;
   for (int32_t c : candidates_) next_values[c] = kUnreached;
 }
 
 // Row next is behind row cur by the candidates of the frames since it was
 // last written; copying just those is usually far less than the whole row.
 void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
-  const int32_t frames = std::min(value_count_ - 1, t);
+  const int32_t frames = std::min(row_count_ - 1, t);
   size_t behind = 0;
   for (int32_t back = 1; back <= frames; ++back) {
-    behind += changed_[(t - back) % value_count_].size();
+    behind += changed_[(t - back) % row_count_].size();
   }
   // A scattered copy costs several times a streamed one per state: from an
   // eighth of the row on, copying the whole row is the cheaper.
@@ -250,26 +266,10 @@ void Apm::CatchUpRow(int32_t t, const double* values, double* next_values) {
     return;
   }
   for (int32_t back = 1; back <= frames; ++back) {
-    for (int32_t s : changed_[(t - back) % value_count_]) {
+    for (int32_t s : changed_[(t - back) % row_count_]) {
       next_values[s] = values[s];
     }
   }
-}
-
-// The first state with the largest value after the last frame.
-int32_t Apm::BestFinalState() const {
-  // Below any value a row holds, kUnreached included.
-  constexpr double kBelowEveryValue = -10000000.0;
-  const double* last = values_.row(time_count_ % value_count_);
-  int32_t state = 0;
-  double best = kBelowEveryValue;
-  for (int32_t s = 0; s < state_count_; ++s) {
-    if (last[s] > best) {
-      best = last[s];
-      state = s;
-    }
-  }
-  return state;
 }
 
 void Apm::Run(std::function<bool(float)> progress) {
@@ -281,8 +281,8 @@ void Apm::Run(std::function<bool(float)> progress) {
                 << static_cast<float>(t) / frames_per_second_ << " sec";
       if (progress && progress(static_cast<float>(t) / time_count_)) return;
     }
-    const int32_t cur = t % value_count_;
-    const int32_t next = (t + 1) % value_count_;
+    const int32_t cur = t % row_count_;
+    const int32_t next = (t + 1) % row_count_;
     comb_out_ = comb_.Filter(detection_, t);
     PrepareStep(t, cur, next, active);
     Transition(cur, next, active);
@@ -309,60 +309,60 @@ void Apm::SelectBeam(int32_t next) {
 // The state's wrapped phase offset at the current frame: frames since its
 // nearest beat, negative before it.
 int32_t Apm::Offset(int32_t state) const {
-  const int32_t lag = state_lag_[state];
-  return WrappedPhaseOffset(frame_phase_[lag - min_lag_], lag,
-                            state_phase_[state]);
+  const StateShape& shape = shape_[state];
+  int32_t x = frame_phase_[shape.lag_index] - shape.phase;
+  x += x <= -shape.half ? shape.lag : 0;
+  x -= x > shape.half ? shape.lag : 0;
+  return x;
 }
 
 // The best of all beam entries for every candidate; for the on-beat states
-// through the grouped scoring when it applies.
+// through the grouped scoring when it applies. The orphan lists follow the
+// new predecessors in candidate order.
 void Apm::Transition(int32_t cur, int32_t next, int32_t active) {
   // With a single value row, entries read later see this frame's updates,
   // which only the pass in beam order reproduces.
   if (next == cur || config_.plain_search) {
     TransitionOneByOne(cur, next, active);
-  } else {
-    const double* values = values_.row(cur);
-    const double bonus = config_.beat_bonus;
-    for (int32_t k = 0; k < active; ++k) {
-      const int32_t f = beam_[k];
-      entry_base_[k] = bonus + (values[f] == kUnreached ? 0.0 : values[f]);
-      entry_lag_[k] = state_lag_[f] - min_lag_;
-      entry_offset_[k] = Offset(f);
+    for (int32_t c : candidates_) {
+      if (predecessor_[c] != linked_parent_[c]) Relink(c);
     }
-    const BeamEntries entries{entry_base_.data(), entry_lag_.data(),
-                              entry_offset_.data(), active};
-    double* next_values = values_.row(next);
-    size_t first = 0;
-    if (transition_.ScoreOnBeat(entries, comb_out_, tempo_prior_.data(),
-                                best_.data(), best_from_.data())) {
-      for (int32_t j = 0; j < lag_count_; ++j) {
-        const int32_t c = candidates_[j];
-        if (best_[j] > next_values[c]) {
-          next_values[c] = best_[j];
-          predecessor_[c] = beam_[best_from_[j]];
-        }
-      }
-      first = lag_count_;
-    }
-    // The others one at a time, as the pass over all candidates would.
-    for (size_t i = first; i < candidates_.size(); ++i) {
-      const int32_t c = candidates_[i];
-      const int32_t lag = state_lag_[c] - min_lag_;
-      int32_t from = -1;
-      transition_.ScoreState(entries, lag, Offset(c), observation_[c],
-                             tempo_prior_[lag], &next_values[c], &from);
-      if (from != -1) predecessor_[c] = beam_[from];
-    }
+    return;
   }
-  // Keeps the orphan lists in step with the new predecessors.
-  for (int32_t c : candidates_) {
-    if (predecessor_[c] != linked_parent_[c]) Relink(c);
+  const BeamEntries entries{entry_base_.data(), entry_lag_.data(),
+                            entry_offset_.data(), active};
+  double* next_values = values_.row(next);
+  size_t first = 0;
+  if (transition_.ScoreOnBeat(entries, comb_out_, tempo_prior_.data(),
+                              best_.data(), best_from_.data())) {
+    for (int32_t j = 0; j < lag_count_; ++j) {
+      const int32_t c = candidates_[j];
+      if (best_[j] > next_values[c]) {
+        next_values[c] = best_[j];
+        predecessor_[c] = beam_[best_from_[j]];
+        // Relinked at once, still in candidate order: the lists' order is
+        // the order in which later frames find their orphans.
+        if (predecessor_[c] != linked_parent_[c]) Relink(c);
+      }
+    }
+    first = lag_count_;
+  }
+  // The others one at a time, as the pass over all candidates would.
+  for (size_t i = first; i < candidates_.size(); ++i) {
+    const int32_t c = candidates_[i];
+    const int32_t lag = shape_[c].lag_index;
+    int32_t from = -1;
+    transition_.ScoreState(entries, lag, Offset(c), observation_[c],
+                           tempo_prior_[lag], &next_values[c], &from);
+    if (from != -1) {
+      predecessor_[c] = beam_[from];
+      if (predecessor_[c] != linked_parent_[c]) Relink(c);
+    }
   }
 }
 
 // Moves a state to the list of its current predecessor.
-void Apm::Relink(int32_t state) {
+inline void Apm::Relink(int32_t state) {
   const int32_t parent = predecessor_[state];
   const int32_t old = linked_parent_[state];
   const int32_t before = previous_sibling_[state];
@@ -399,6 +399,22 @@ void Apm::Backtrack() {
   }
 }
 
+// The first state with the largest value after the last frame.
+int32_t Apm::BestFinalState() const {
+  // Below any value a row holds, kUnreached included.
+  constexpr double kBelowEveryValue = -10000000.0;
+  const double* last = values_.row(time_count_ % row_count_);
+  int32_t state = 0;
+  double best = kBelowEveryValue;
+  for (int32_t s = 0; s < state_count_; ++s) {
+    if (last[s] > best) {
+      best = last[s];
+      state = s;
+    }
+  }
+  return state;
+}
+
 void Apm::PlaceBeats() {
   beat_times_ =
       BeatFramesToSeconds(PlaceBeatFrames(history_.path(), state_lag_,
@@ -414,10 +430,10 @@ void Apm::TransitionOneByOne(int32_t cur, int32_t next, int32_t active) {
   const int32_t count = static_cast<int32_t>(candidates_.size());
   for (int32_t j = 0; j < count; ++j) {
     const int32_t c = candidates_[j];
-    candidate_lag_[j] = state_lag_[c];
+    candidate_lag_[j] = shape_[c].lag;
     candidate_offset_[j] = Offset(c);
     candidate_observation_[j] = observation_[c];
-    candidate_prior_[j] = tempo_prior_[state_lag_[c] - min_lag_];
+    candidate_prior_[j] = tempo_prior_[shape_[c].lag_index];
   }
   const int32_t last_period = config_.period_table_size - 1;
   const int32_t last_phase = config_.phase_table_size - 1;
@@ -427,7 +443,7 @@ void Apm::TransitionOneByOne(int32_t cur, int32_t next, int32_t active) {
     const int32_t f = beam_[k];
     const double base =
         config_.beat_bonus + (values[f] == kUnreached ? 0.0 : values[f]);
-    const int32_t lag = state_lag_[f];
+    const int32_t lag = shape_[f].lag;
     const int32_t offset = Offset(f);
     for (int32_t j = 0; j < count; ++j) {
       const double period = period_change_score_[std::min(

@@ -137,6 +137,8 @@ class Apm {
   int32_t time_count_ = 0;
   int32_t state_count_ = 0;
   int32_t value_count_ = 0;
+  // Rows of the ring kept: 2, or value_count_ if that is less.
+  int32_t row_count_ = 0;
   int32_t apmtime_count_ = 0;
   int32_t min_lag_ = 0;
   int32_t max_lag_ = 0;
@@ -148,7 +150,7 @@ class Apm {
   CombBank comb_;
   // This frame's comb outputs, by lag index.
   const double* comb_out_ = nullptr;
-  // Ring of value_count_ rows.
+  // Ring of row_count_ rows.
   Table<double> values_;
   std::vector<int32_t> predecessor_;
   std::vector<double> observation_;
@@ -183,11 +185,19 @@ class Apm {
   std::vector<int32_t> best_from_;
   TransitionScorer transition_;
   BeamSelector selector_;
-  // The candidates of the last value_count_ frames, by frame modulo
-  // value_count_: the states where the rows of the ring differ.
+  // The candidates of the last row_count_ frames, by frame modulo
+  // row_count_: the states where the rows of the ring differ.
   std::vector<std::vector<int32_t>> changed_;
   // The current frame modulo every lag.
   std::vector<int32_t> frame_phase_;
+  // What the per-frame steps look up of a state, side by side.
+  struct StateShape {
+    int32_t lag_index;
+    int32_t lag;
+    int32_t half;
+    int32_t phase;
+  };
+  std::vector<StateShape> shape_;
   // The states with a given predecessor, as lists linked through the
   // states: so the states orphaned by the beam are found without a scan.
   std::vector<int32_t> first_child_;

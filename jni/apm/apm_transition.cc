@@ -61,23 +61,25 @@ bool Bounded(const double* v, size_t n, double* max_abs) {
 }
 
 // Bounded for the bases of a beam of count >= 1 entries, telling on the
-// way whether they ascend: the beam's usual order, which Keep takes as it
-// is then.
+// way whether they ascend (the beam's usual order, which Keep takes as it
+// is then) and, if so, the least step between neighbours. Ascending bases
+// lie between the first and the last, which bound them all.
 bool BoundedBases(const double* base, int32_t count, double* max_abs,
-                  bool* ascending) {
-  double largest = 0.0;
-  double previous = base[0];
+                  bool* ascending, double* least_step) {
   bool up = true;
-  for (int32_t k = 0; k < count; ++k) {
-    const double a = std::abs(base[k]);
-    if (!(a <= kLargest)) return false;
-    largest = std::max(largest, a);
-    up &= previous <= base[k];
-    previous = base[k];
+  double step = std::numeric_limits<double>::infinity();
+  for (int32_t k = 1; k < count; ++k) {
+    const double d = base[k] - base[k - 1];
+    up &= d >= 0.0;
+    step = std::min(step, d);
   }
-  *max_abs = largest;
   *ascending = up;
-  return true;
+  *least_step = step;
+  if (up) {
+    *max_abs = std::max(std::abs(base[0]), std::abs(base[count - 1]));
+    return *max_abs <= kLargest;
+  }
+  return Bounded(base, count, max_abs);
 }
 
 // In any order of offers this keeps the first entry with the largest
@@ -105,6 +107,7 @@ void TransitionScorer::SetUp(int32_t lag_count, int32_t offset_range,
                              const std::vector<double>& phase_deviation_score) {
   lag_count_ = lag_count;
   offset_range_ = offset_range;
+  avx_ = instruction_set::HasAvx();
   period_ = period_change_score;
   phase_ = phase_deviation_score;
   period_by_difference_ = ByDifference(period_, lag_count - 1);
@@ -123,7 +126,7 @@ void TransitionScorer::SetUp(int32_t lag_count, int32_t offset_range,
     period_gain_ = std::max(period_gain_, period_[d] - period_.back());
     near_at_least_tail_ &= period_[d] >= period_.back();
   }
-  seen_.Reset(static_cast<size_t>(lag_count) * (phase_tail_ + 1));
+  seen_.Reset(static_cast<size_t>(lag_count) * kMostPhaseClasses);
 }
 
 bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
@@ -134,8 +137,10 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
   double observation_max = 0.0;
   double prior_max = 0.0;
   bool ascending = false;
+  double least_step = 0.0;
   if (!usable_ || entries.count < 1 ||
-      !BoundedBases(entries.base, entries.count, &base_max, &ascending) ||
+      !BoundedBases(entries.base, entries.count, &base_max, &ascending,
+                    &least_step) ||
       !Bounded(observation, lag_count_, &observation_max) ||
       !Bounded(prior, lag_count_, &prior_max)) {
     return false;
@@ -148,11 +153,10 @@ bool TransitionScorer::ScoreOnBeat(const BeamEntries& entries,
   // margin covers them all many times over.
   const double bound =
       base_max + observation_max + period_max_abs_ + phase_max_abs_ + prior_max;
-  delta_ =
-      std::ldexp(bound, -50) + 16 * std::numeric_limits<double>::denorm_min();
-  margin_ =
-      std::ldexp(bound, -46) + 16 * std::numeric_limits<double>::denorm_min();
-  Keep(entries, ascending);
+  // Scaled by products, which round as ldexp does.
+  delta_ = bound * 0x1p-50 + 16 * std::numeric_limits<double>::denorm_min();
+  margin_ = bound * 0x1p-46 + 16 * std::numeric_limits<double>::denorm_min();
+  Keep(entries, ascending, ascending && least_step > delta_);
   FindLeader();
   std::fill_n(best, lag_count_, -std::numeric_limits<double>::infinity());
   std::fill_n(from, lag_count_, entries.count);
@@ -169,7 +173,7 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
   const double* period = period_by_difference_.data() + lag_count_ - 1 - lag;
   const double* phase = phase_by_difference_.data() + offset_range_ - offset;
 #if defined(__x86_64__)
-  if (instruction_set::HasAvx()) {
+  if (avx_) {
     ScoreStateAvx(entries.base, entries.lag, entries.offset, entries.count,
                   period, phase, observation, prior, best, from);
     return;
@@ -193,21 +197,28 @@ void TransitionScorer::ScoreState(const BeamEntries& entries, int32_t lag,
 
 // Entries by descending base. The beam comes out of the selection in
 // ascending order of value, so this is usually a reversal, taken without
-// an index table.
-void TransitionScorer::Keep(const BeamEntries& entries, bool ascending) {
+// an index table; spaced (no two bases within delta) then too, so that no
+// entry is crowded.
+void TransitionScorer::Keep(const BeamEntries& entries, bool ascending,
+                            bool spaced) {
   const int32_t count = entries.count;
   const double* base = entries.base;
-  if (ascending) {
-    KeepInOrder(entries, [count](int32_t i) { return count - 1 - i; });
+  const auto reversed = [count](int32_t i) { return count - 1 - i; };
+  if (spaced) {
+    KeepInOrder<false>(entries, reversed);
+  } else if (ascending) {
+    KeepInOrder<true>(entries, reversed);
   } else {
     order_.resize(count);
     for (int32_t k = 0; k < count; ++k) order_[k] = count - 1 - k;
     std::sort(order_.begin(), order_.end(),
               [base](int32_t a, int32_t b) { return base[a] > base[b]; });
-    KeepInOrder(entries, [this](int32_t i) { return order_[i]; });
+    KeepInOrder<true>(entries, [this](int32_t i) { return order_[i]; });
   }
   // Kept entries by class, keeping their order within a class.
   const int32_t class_count = phase_tail_ + 1;
+  class_start_.assign(class_count + 1, 0);
+  for (int32_t i = 0; i < kept_count_; ++i) ++class_start_[kept_[i].phase_class + 1];
   for (int32_t q = 0; q < class_count; ++q) {
     class_start_[q + 1] += class_start_[q];
   }
@@ -218,43 +229,47 @@ void TransitionScorer::Keep(const BeamEntries& entries, bool ascending) {
   }
 }
 
-// Entry index(i) is the i-th by descending base. Members are read into
-// locals first: the stores of the loop could alias them for all the
-// compiler knows.
-template <typename Index>
+// Entry index(i) is the i-th by descending base; with kMayCrowd false no
+// two are within delta. Members are read into locals first: the stores of
+// the loop could alias them for all the compiler knows.
+template <bool kMayCrowd, typename Index>
 void TransitionScorer::KeepInOrder(const BeamEntries& entries, Index index) {
   seen_.NextGeneration();
   const GenerationMarks::Marker seen = seen_.Hold();
   const int32_t count = entries.count;
   if (kept_.size() < static_cast<size_t>(count)) kept_.resize(count);
-  const int32_t phase_tail = phase_tail_;
-  const int32_t class_count = phase_tail + 1;
-  class_start_.assign(class_count + 1, 0);
-  int32_t* const class_end = class_start_.data() + 1;
-  Kept* const out = kept_.data();
+  if (close_.size() < static_cast<size_t>(count) + 1) close_.resize(count + 1);
   const double* const bases = entries.base;
   const int32_t* const lags = entries.lag;
   const int32_t* const offsets = entries.offset;
-  const double delta = delta_;
-  int32_t kept = 0;
-  // Whether the entry is within delta of the one before, and of the one
-  // after: the same difference serves both entries of a pair.
-  bool close_before = false;
+  // close[i]: whether entries i - 1 and i are within delta. A pass of its
+  // own leaves the loop below few enough values for the registers.
+  uint8_t* const close = close_.data();
+  if (kMayCrowd) {
+    const double delta = delta_;
+    close[0] = 0;
+    for (int32_t i = 1; i < count; ++i) {
+      close[i] = bases[index(i - 1)] - bases[index(i)] <= delta;
+    }
+    close[count] = 0;
+  }
+  const int32_t phase_tail = phase_tail_;
+  Kept* out = kept_.data();
   for (int32_t i = 0; i < count; ++i) {
     const int32_t e = index(i);
-    const double base = bases[e];
-    const bool close_after = i + 1 < count && base - bases[index(i + 1)] <= delta;
-    const bool crowded = close_before | close_after;
-    close_before = close_after;
     const int32_t lag = lags[e];
     const int32_t phase_class = std::min(std::abs(offsets[e]), phase_tail);
-    const bool first = seen.Mark(static_cast<size_t>(lag) * class_count + phase_class);
+    const bool first = seen.Mark(static_cast<size_t>(lag) * kMostPhaseClasses + phase_class);
+    const bool crowded = kMayCrowd && (close[i] | close[i + 1]);
     // Written in any case, counted only when kept: fewer branches.
-    out[kept] = {base, lag, phase_class, e, crowded};
-    class_end[phase_class] += first | crowded;
-    kept += first | crowded;
+    out->base = bases[e];
+    out->lag = lag;
+    out->phase_class = phase_class;
+    out->entry = e;
+    out->crowded = crowded;
+    out += first | crowded;
   }
-  kept_count_ = kept;
+  kept_count_ = static_cast<int32_t>(out - kept_.data());
 }
 
 void TransitionScorer::FindLeader() {
@@ -286,13 +301,12 @@ void TransitionScorer::ScoreNear(const double* observation, const double* prior,
   for (int32_t i = 0; i < kept_count_; ++i) {
     const Kept& k = kept_[i];
     const double phase = phase_[k.phase_class];
+    const double* period = period_by_difference_.data() + lag_count_ - 1 - k.lag;
     int32_t first = std::max(0, k.lag - period_tail_ + 1);
     int32_t last = std::min(lag_count_ - 1, k.lag + period_tail_ - 1);
     Limit(k.base + phase + period_gain_, &first, &last);
     for (int32_t j = first; j <= last; ++j) {
-      const double score =
-          k.base + (((observation[j] + period_[std::abs(j - k.lag)]) + phase) +
-                    prior[j]);
+      const double score = k.base + (((observation[j] + period[j]) + phase) + prior[j]);
       Offer(score, k.entry, &best[j], &from[j]);
     }
   }
@@ -312,8 +326,19 @@ void TransitionScorer::ScoreFar(const double* observation, const double* prior,
     int32_t first = 0;
     int32_t last = lag_count_ - 1;
     Limit(top.base + phase, &first, &last);
-    for (int32_t j = first; j <= last; ++j) {
-      // Most lags are far from the class's top entry.
+    // Most lags are far from the class's top entry, and the top is rarely
+    // crowded: those lags need neither the walk nor the tie check.
+    const int32_t near_first = top.crowded ? first : top.lag - period_tail_ + 1;
+    const int32_t near_last = top.crowded ? last : top.lag + period_tail_ - 1;
+    const auto far_run = [&](int32_t begin, int32_t end) {
+      for (int32_t j = begin; j <= end; ++j) {
+        const double x = ((observation[j] + tail) + phase) + prior[j];
+        Offer(top.base + x, top.entry, &best[j], &from[j]);
+      }
+    };
+    far_run(first, std::min(last, near_first - 1));
+    for (int32_t j = std::max(first, near_first); j <= std::min(last, near_last);
+         ++j) {
       int32_t i = 0;
       if (std::abs(top.lag - j) < period_tail_) {
         for (i = 1;
@@ -333,6 +358,7 @@ void TransitionScorer::ScoreFar(const double* observation, const double* prior,
         }
       }
     }
+    far_run(std::max(first, near_last + 1), last);
   }
 }
 

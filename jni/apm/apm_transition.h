@@ -60,8 +60,8 @@ class TransitionScorer {
     bool crowded;
   };
 
-  void Keep(const BeamEntries& entries, bool ascending);
-  template <typename Index>
+  void Keep(const BeamEntries& entries, bool ascending, bool spaced);
+  template <bool kMayCrowd, typename Index>
   void KeepInOrder(const BeamEntries& entries, Index index);
   void FindLeader();
   void Limit(double key, int32_t* first, int32_t* last) const;
@@ -88,6 +88,8 @@ class TransitionScorer {
   double period_gain_ = 0.0;
   bool near_at_least_tail_ = false;
   bool usable_ = false;
+  // Read once: ScoreState runs for every orphan.
+  bool avx_ = false;
 
   // Per call: how close two bases must be to possibly tie, how much the
   // rounding of a score can change comparisons of keys, and the leader.
@@ -100,6 +102,8 @@ class TransitionScorer {
   std::vector<int32_t> order_;
   std::vector<Kept> kept_;
   int32_t kept_count_ = 0;
+  // KeepInOrder's scratch: which neighbours by base are within delta.
+  std::vector<uint8_t> close_;
   // Positions in kept_ by phase class, largest base first within a class;
   // class q takes by_class_[class_start_[q] .. class_start_[q + 1]).
   std::vector<int32_t> by_class_;

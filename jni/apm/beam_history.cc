@@ -44,8 +44,8 @@ void BeamHistory::Append(const int32_t* beam, const int32_t* predecessor) {
   for (int32_t k = 0; k < width_; ++k) {
     const int32_t s = beam[k];
     row[k] = static_cast<uint16_t>(s);
-    from[k] = predecessor[s] == -1 ? kNoPredecessor
-                                   : static_cast<uint16_t>(predecessor[s]);
+    // -1 wraps to kNoPredecessor.
+    from[k] = static_cast<uint16_t>(predecessor[s]);
   }
   const int32_t undecided = last_row_ - decided_;
   if (!keep_every_row_ &&
@@ -58,9 +58,11 @@ void BeamHistory::Append(const int32_t* beam, const int32_t* predecessor) {
 bool BeamHistory::Follow(int32_t t, int32_t* state) {
   const uint16_t* row = states(t);
   int32_t s = *state;
-  int32_t k = 0;
-  while (k < width_ && row[k] != s) ++k;
-  const bool found = k < width_;
+  // From the end, where a row keeps its best states and the path mostly
+  // runs; a row holds a state once, so this finds the same entry.
+  int32_t k = width_ - 1;
+  while (k >= 0 && row[k] != s) --k;
+  const bool found = k >= 0;
   if (!found) {
     k = width_ - 1;
     if (s == -1) s = row[k];
@@ -80,7 +82,9 @@ void BeamHistory::AddWay(int32_t state, std::vector<int32_t>* ways) {
 }
 
 int32_t BeamHistory::StepBack(int32_t t, int32_t s) const {
-  const int32_t k = s == -1 || position_[s] == -1 ? width_ - 1 : position_[s];
+  // A position left from another row holds a different state there.
+  int32_t k = s == -1 ? -1 : position_[s];
+  if (k == -1 || states(t)[k] != s) k = width_ - 1;
   const uint16_t predecessor = predecessors(t)[k];
   return predecessor == kNoPredecessor ? -1 : predecessor;
 }
@@ -106,7 +110,6 @@ void BeamHistory::CheckForMerge() {
     way_mark_.NextGeneration();
     next_ways_.clear();
     for (const int32_t s : ways_) AddWay(StepBack(t, s), &next_ways_);
-    for (int32_t k = 0; k < width_; ++k) position_[row[k]] = -1;
     ways_.swap(next_ways_);
   }
 }

@@ -76,8 +76,9 @@ class BeamHistory {
   // Ascending.
   std::vector<int32_t> broken_;
 
-  // Scratch of the merge check: the position of each state in one row, and
-  // the states the ways back are in.
+  // Scratch of the merge check: the position of each state in the row last
+  // stepped through (never cleared, so other states may keep positions in
+  // older rows), and the states the ways back are in.
   std::vector<int32_t> position_;
   std::vector<int32_t> ways_;
   std::vector<int32_t> next_ways_;

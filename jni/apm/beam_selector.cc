@@ -63,17 +63,21 @@ void BeamSelector::Finish(const double* values, int32_t count, int32_t width,
                           int32_t* beam) {
   // Only a value below the beam shows that the beam's values are above all
   // the others.
+  // The heap keeps exactly these and pops them in ascending order; written
+  // while checking, and overwritten by the heap if the check fails.
   bool distinct = above_.size() > static_cast<size_t>(width);
-  for (int32_t k = 0; distinct && k < width; ++k) {
-    distinct = above_[k].value > above_[k + 1].value;
+  if (distinct) {
+    const BeamEntry* const ranked = above_.data();
+    for (int32_t k = 0; k < width; ++k) {
+      distinct &= ranked[k].value > ranked[k + 1].value;
+      beam[width - 1 - k] = ranked[k].state;
+    }
   }
   has_floor_ = distinct;
   if (!distinct) {
     SelectByHeap(values, count, width, beam);
     return;
   }
-  // The heap keeps exactly these and pops them in ascending order.
-  for (int32_t k = 0; k < width; ++k) beam[k] = above_[width - 1 - k].state;
   // Spare ranks below the beam, so that the next row usually still has
   // more than width values at or above the floor.
   floor_ = above_[std::min(above_.size() - 1, width + kSpareRanks)].value;

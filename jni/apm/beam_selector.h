@@ -49,7 +49,7 @@ class BeamSelector {
   // floor leaves the ranking; the spares make up for those losses on most
   // frames (when they do not, a full Select follows) while keeping the
   // ranking short to merge.
-  static constexpr size_t kSpareRanks = 16;
+  static constexpr size_t kSpareRanks = 32;
 
   std::vector<BeamEntry> heap_;
   std::vector<BeamEntry> above_;

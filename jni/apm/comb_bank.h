@@ -10,6 +10,10 @@
 
 namespace apm {
 
+// static_cast<float>(std::exp(logged)) for logged = std::log(y), mostly
+// without calling exp.
+float FloatOfExp(double y, double logged);
+
 class CombBank {
  public:
   // input_weight of 1 or more leaves the filters without feedback;
@@ -23,15 +27,14 @@ class CombBank {
   const double* Filter(const std::vector<float>& detection, int32_t t);
 
  private:
-  double* row(int32_t t) {
-    return outputs_.data() + static_cast<size_t>(t % rows_) * lag_frames_.size();
-  }
-
   std::vector<int32_t> lag_frames_;
   double input_weight_ = 0.0;
   double start_factor_ = 0.0;
   int32_t rows_ = 0;
   std::vector<double> outputs_;
+  // The feedback reads every output once, through exp and as a float:
+  // kept so, from when the output was made.
+  std::vector<float> exp_outputs_;
 };
 
 }  // namespace apm
