@@ -22,11 +22,9 @@ TEST(PreciseTempo, SharedBeatLists) {
     if (line.empty() || line[0] == '#') continue;
     std::istringstream fields(line);
     std::string name, runs, noise, bpm_text, tolerance;
-    std::getline(fields, name, '\t');
-    std::getline(fields, runs, '\t');
-    std::getline(fields, noise, '\t');
-    std::getline(fields, bpm_text, '\t');
-    std::getline(fields, tolerance);
+    for (std::string* field : {&name, &runs, &noise, &bpm_text, &tolerance}) {
+      std::getline(fields, *field, '\t');
+    }
     const double bpm = std::stod(bpm_text);  // reads NaN, where >> does not
     std::istringstream run_fields(runs);
     std::vector<double> beats;
