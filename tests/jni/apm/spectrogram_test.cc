@@ -19,18 +19,6 @@ std::vector<float> Noise(size_t count, unsigned seed) {
   return samples;
 }
 
-TEST(SpectrogramHelpers, PowerOfTwoAndPeriodicHann) {
-  for (auto [n, expected] :
-       {std::pair{-5, 0}, {0, 0}, {1, 1}, {3, 4}, {1764, 2048}, {2048, 2048}}) {
-    EXPECT_EQ(NextPowerOfTwo(n), expected) << n;
-  }
-  std::vector<double> window;
-  MakePeriodicHannWindow(4, &window);
-  ASSERT_EQ(window.size(), 4u);
-  const double expected[] = {0.0, 0.5, 1.0, 0.5};
-  for (int i = 0; i < 4; ++i) EXPECT_NEAR(window[i], expected[i], 1e-15) << i;
-}
-
 // A failed set-up leaves the spectrogram unusable until a good one.
 TEST(Spectrogram, RejectsBadSettingsAndRecovers) {
   Spectrogram spectrogram;
