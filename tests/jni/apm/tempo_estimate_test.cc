@@ -3,23 +3,21 @@
 #include <gtest/gtest.h>
 
 #include <cmath>
-#include <fstream>
 #include <random>
 #include <sstream>
 #include <string>
 #include <vector>
+
+#include "tests/shared_cases.h"
 
 namespace apm {
 namespace {
 
 // The cases the Java twin checks too.
 TEST(PreciseTempo, SharedBeatLists) {
-  std::ifstream cases(CLIPWEAVER_SOURCE_DIR "/tests/jni/apm/precise_tempo_cases.tsv");
-  ASSERT_TRUE(cases.good());
-  std::string line;
-  int rows = 0;
-  while (std::getline(cases, line)) {
-    if (line.empty() || line[0] == '#') continue;
+  const std::vector<std::string> rows = shared_cases::Rows("precise_tempo_cases.tsv");
+  EXPECT_GE(rows.size(), 15u);
+  for (const std::string& line : rows) {
     std::istringstream fields(line);
     std::string name, runs, noise, bpm_text, tolerance;
     for (std::string* field : {&name, &runs, &noise, &bpm_text, &tolerance}) {
@@ -45,9 +43,7 @@ TEST(PreciseTempo, SharedBeatLists) {
     } else {
       EXPECT_NEAR(got, bpm, std::stod(tolerance)) << name;
     }
-    ++rows;
   }
-  EXPECT_GE(rows, 15);
 }
 
 }  // namespace

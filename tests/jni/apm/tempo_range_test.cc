@@ -4,23 +4,21 @@
 
 #include <cmath>
 #include <cstdlib>
-#include <fstream>
 #include <sstream>
 #include <string>
+#include <vector>
 
 #include "jni/apm/analysis_frame_rate.h"
+#include "tests/shared_cases.h"
 
 namespace apm {
 namespace {
 
 // The cases the Java twin checks too, so that both give the same verdicts.
 TEST(TempoRange, SharedCasesGiveTheirMessages) {
-  std::ifstream cases(CLIPWEAVER_SOURCE_DIR "/tests/jni/apm/tempo_range_cases.tsv");
-  ASSERT_TRUE(cases.good());
-  std::string line;
-  int rows = 0;
-  while (std::getline(cases, line)) {
-    if (line.empty() || line[0] == '#') continue;
+  const std::vector<std::string> rows = shared_cases::Rows("tempo_range_cases.tsv");
+  EXPECT_GE(rows.size(), 10u);
+  for (const std::string& line : rows) {
     std::istringstream fields(line);
     std::string min, max, rate, message;
     std::getline(fields >> min >> max >> rate >> std::ws, message);
@@ -31,9 +29,7 @@ TEST(TempoRange, SharedCasesGiveTheirMessages) {
                               FrameRateAt(std::atoi(rate.c_str())).frames_per_second),
               message)
         << line;
-    ++rows;
   }
-  EXPECT_GE(rows, 10);
 }
 
 TEST(TempoRange, ConfigSetsPeriodsAndPrior) {
