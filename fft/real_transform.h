@@ -195,10 +195,12 @@ void Combine(int n, double* a, const double* tw, const double* c, int nc) {
 // columns (c, c + 1) for odd c and their mirrors (q - c - 1, q - c) go from
 // the butterflies to Combine's groups c, c + 1, q - c - 1 and q - c without
 // a round through memory. The columns 0 and q/2 - 1 .. q/2 + 1 and their
-// groups are left over and done one at a time.
-template <typename V, typename W, bool kForward>
-void LastPassAndCombine(int n, double* a, const double* w_end, int nc) {
-  const int h = n >> 2, q = h >> 2;
+// groups are left over and done one at a time. n is a constant, kN: with
+// every offset known, the pointers no longer take registers from the
+// butterflies.
+template <typename V, typename W, bool kForward, int kN>
+void LastPassAndCombine(double* a, const double* w_end, int nc) {
+  constexpr int n = kN, h = n >> 2, q = h >> 2;
   const std::ptrdiff_t im = 2 * h, s = h / 2, step = nc / h;
   const double* const t = w_end - h / 2;
   const double* const tw = w_end - h;
@@ -320,8 +322,16 @@ void ComplexStage(int n, double* data, const double* w_end, int nc) {
     // set.
     if (n >= 256 && n <= 2048) {
       LaneTransform<V, W, !kForward, false>(n, data, w_end);
-      LastPassAndCombine<V, W, kForward>(n, data, w_end, nc);
-      return;
+      switch (n) {
+        case 256:
+          return LastPassAndCombine<V, W, kForward, 256>(data, w_end, nc);
+        case 512:
+          return LastPassAndCombine<V, W, kForward, 512>(data, w_end, nc);
+        case 1024:
+          return LastPassAndCombine<V, W, kForward, 1024>(data, w_end, nc);
+        default:
+          return LastPassAndCombine<V, W, kForward, 2048>(data, w_end, nc);
+      }
     }
   }
   LaneTransform<V, W, !kForward>(n, data, w_end);

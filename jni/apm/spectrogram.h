@@ -13,6 +13,8 @@
 #include <functional>
 #include <vector>
 
+#include "base/aligned_allocator.h"
+
 namespace apm {
 
 using SpectrogramFrame = std::vector<std::complex<float>>;
@@ -62,7 +64,7 @@ class Spectrogram {
   int32_t step_length_ = 0;
   bool is_initialized_ = false;
   std::vector<double> window_;
-  std::vector<double> fft_buffer_;
+  CacheLineVector<double> fft_buffer_;
   // Only a window that straddles two inputs is gathered here; queue_[0 ..
   // queue_start_) belongs to frames already taken.
   std::vector<float> queue_;
