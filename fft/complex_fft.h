@@ -289,8 +289,9 @@ template <typename V, typename W>
 void PairedRadix4Pass(int length, double* a, std::ptrdiff_t im, int h, const double* t);
 
 // The first three stages forward in blocks of eight (paired_radix4.h), for
-// a W that holds two V and h = n/4 an odd power of two from 32 on.
-template <typename V, typename W>
+// a W that holds two V and h = n/4 an odd power of two from 32 on; n is
+// kN where that is not 0.
+template <typename V, typename W, int kN = 0>
 void FirstStagesOfEight(int n, double* a);
 
 // The complex stage up to its last stage, forward (exp(+...)) or on the
@@ -306,7 +307,15 @@ void LaneTransform(int n, double* a, const double* w_end) {
   int length = 16;
   if constexpr (!kConj && !std::is_same_v<V, W>) {
     if (n >= 128 && !(n & 0x55555555)) {
-      FirstStagesOfEight<V, W>(n, a);
+      // The spectrogram's usual lengths run with constant offsets: 13 %
+      // faster at 2048.
+      if (n == 512) {
+        FirstStagesOfEight<V, W, 512>(n, a);
+      } else if (n == 2048) {
+        FirstStagesOfEight<V, W, 2048>(n, a);
+      } else {
+        FirstStagesOfEight<V, W>(n, a);
+      }
       for (length = 32; kLastPass ? length <= h : length < h; length *= 4) {
         PairedRadix4Pass<V, W>(length, a, im, h, w_end - length / 2);
       }

@@ -40,8 +40,9 @@ SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
 // with the one h/2 on. The blocks with R from 4g to 4g + 3 form group g,
 // which reads what group reverse(g) writes; one group of each pair goes
 // through a buffer.
-template <typename V, typename W>
+template <typename V, typename W, int kN>
 void FirstStagesOfEight(int n, double* a) {
+  if constexpr (kN != 0) n = kN;
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int bits = 0;
