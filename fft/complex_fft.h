@@ -96,6 +96,17 @@ inline void ReadPair(const double* a, int h, int e, Complex2<V>* sum, Complex2<V
   *difference = first - second;
 }
 
+// The same two elements as the halves of one W, from the input points at p
+// = a + 4e and p + 2h: the sums and differences come first and are sorted
+// into real and imaginary parts afterwards.
+template <typename W>
+inline Complex2<W> ReadJoinedPair(const double* p, int h) {
+  const W x = Load<W>(p), y = Load<W>(p + 2 * h);
+  const W sum = x + y, difference = x - y;
+  const W low = LowHalves(sum, difference), high = HighHalves(sum, difference);
+  return {UnpackLow(low, high), UnpackHigh(low, high)};
+}
+
 // Input points to lane layout in bit-reversed order, for decimation in time,
 // with the first kStages stages (1 or 2) done on the way. Block t, the
 // 2^kStages positions from 2^kStages t on, starts from element reverse(t):
@@ -104,22 +115,19 @@ inline void ReadPair(const double* a, int h, int e, Complex2<V>* sum, Complex2<V
 // reads exactly the places that group reverse(g) writes, so groups are
 // worked out in pairs; two stages need a buffer for one group of the pair.
 // kConj conjugates the input. Needs h >= 2^(2 kStages - 1). A wider W
-// takes the single forward stage.
+// takes the forward stages two elements at a time.
 template <typename V, typename W, bool kConj, int kStages>
 void FirstStages(int n, double* a) {
   const int h = n >> 2;
   const std::ptrdiff_t im = 2 * h;
   int bits = 0;
   for (int m = h; m > 1; m >>= 1) ++bits;
-  if constexpr (kStages == 1 && !kConj && !std::is_same_v<V, W>) {
-    // The same sums and differences with the four points of group e in one
-    // W, sorted into real and imaginary parts afterwards.
+  constexpr bool kJoined = !kConj && !std::is_same_v<V, W>;
+  if constexpr (kStages == 1 && kJoined) {
     const auto read = [&](int e, W* re, W* im_parts) {
-      const W x = Load<W>(a + 4 * e), y = Load<W>(a + 4 * e + 2 * h);
-      const W sum = x + y, difference = x - y;
-      const W low = LowHalves(sum, difference), high = HighHalves(sum, difference);
-      *re = UnpackLow(low, high);
-      *im_parts = UnpackHigh(low, high);
+      const Complex2<W> x = ReadJoinedPair<W>(a + 4 * e, h);
+      *re = x.re;
+      *im_parts = x.im;
     };
     ForEachReversal(
         bits - 1,
@@ -164,18 +172,28 @@ void FirstStages(int n, double* a) {
     constexpr std::ptrdiff_t kBufferIm = 16;
     double buffer[2 * kBufferIm];
     auto block = [&](int e, double* p, std::ptrdiff_t p_im) {
-      Complex2<V> x0, x1, x2, x3;
-      ReadPair<V, kConj>(a, h, e, &x0, &x1);
-      ReadPair<V, kConj>(a, h, e + h / 4, &x2, &x3);
-      Put(p, p_im, x0 + x2);
-      Put(p + 2, p_im, PlusI(x1, x3));
-      Put(p + 4, p_im, x0 - x2);
-      Put(p + 6, p_im, MinusI(x1, x3));
+      if constexpr (kJoined) {
+        // Elements e, e + h/2 and, turned by 1 and i, e + h/4, e + 3h/4:
+        // both butterflies of the second stage at once.
+        const Complex2<W> x = ReadJoinedPair<W>(a + 4 * e, h);
+        const Complex2<W> y = Split(Unturned(), TurnI())(ReadJoinedPair<W>(a + 4 * e + h, h));
+        Put(p, p_im, x + y);
+        Put(p + 4, p_im, x - y);
+      } else {
+        Complex2<V> x0, x1, x2, x3;
+        ReadPair<V, kConj>(a, h, e, &x0, &x1);
+        ReadPair<V, kConj>(a, h, e + h / 4, &x2, &x3);
+        Put(p, p_im, x0 + x2);
+        Put(p + 2, p_im, PlusI(x1, x3));
+        Put(p + 4, p_im, x0 - x2);
+        Put(p + 6, p_im, MinusI(x1, x3));
+      }
     };
+    using U = std::conditional_t<kJoined, W, V>;
     auto unbuffer = [&](double* p) {
-      for (int u = 0; u < 8; u += 2) {
-        Put(p + u, im, Get<V>(buffer + u, kBufferIm));
-        Put(p + h + u, im, Get<V>(buffer + 8 + u, kBufferIm));
+      for (int u = 0; u < 8; u += kJoined ? 4 : 2) {
+        Put(p + u, im, Get<U>(buffer + u, kBufferIm));
+        Put(p + h + u, im, Get<U>(buffer + 8 + u, kBufferIm));
       }
     };
     ForEachReversal(
@@ -323,7 +341,7 @@ void LaneTransform(int n, double* a, const double* w_end) {
     }
   }
   if (n >= 64 && (n & 0x55555555)) {
-    FirstStages<V, V, kConj, 2>(n, a);
+    FirstStages<V, W, kConj, 2>(n, a);
   } else {
     FirstStages<V, W, kConj, 1>(n, a);
     if (n == 16) {

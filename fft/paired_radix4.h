@@ -17,22 +17,6 @@
 namespace fft_internal {
 inline namespace CLIPWEAVER_ISA {
 
-// Turn `low` on the low half of each value and `high` on the high half.
-template <typename TLow, typename THigh>
-struct SplitTurn {
-  template <typename W>
-  Complex2<W> operator()(Complex2<W> x) const {
-    const Complex2<W> l = low(x), h = high(x);
-    return {HighFrom(l.re, h.re), HighFrom(l.im, h.im)};
-  }
-  TLow low;
-  THigh high;
-};
-template <typename TLow, typename THigh>
-SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
-  return {low, high};
-}
-
 // The radix-2 stage of FirstStages and the radix-4 pass of length 8, done
 // on each block of eight in registers with the same arithmetic. Block B
 // starts from element R = reverse(B), and its pairs of positions (0, 1) ..
@@ -49,12 +33,7 @@ void FirstStagesOfEight(int n, double* a) {
   for (int m = h; m > 1; m >>= 1) ++bits;
   // Offsets in doubles: h/2 is h/8 elements.
   const std::ptrdiff_t eighth = h / 2;
-  const auto read = [&](const double* x) {
-    const W x0 = Load<W>(x), x1 = Load<W>(x + 4 * eighth);
-    const W sum = x0 + x1, difference = x0 - x1;
-    const W low = LowHalves(sum, difference), high = HighHalves(sum, difference);
-    return Complex2<W>{UnpackLow(low, high), UnpackHigh(low, high)};
-  };
+  const auto read = [&](const double* x) { return ReadJoinedPair<W>(x, h); };
   const auto block = [&](const double* x, double* p, std::ptrdiff_t p_im) {
     const Complex2<W> x0 = read(x);
     const Complex2<W> x1 = Split(Unturned(), TurnI())(read(x + 2 * eighth));

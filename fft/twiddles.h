@@ -99,6 +99,23 @@ struct TurnI {
   }
 };
 
+// For a W of two V: `low` on the low half of each value and `high` on the
+// high half.
+template <typename TLow, typename THigh>
+struct SplitTurn {
+  template <typename W>
+  Complex2<W> operator()(Complex2<W> x) const {
+    const Complex2<W> l = low(x), h = high(x);
+    return {HighFrom(l.re, h.re), HighFrom(l.im, h.im)};
+  }
+  TLow low;
+  THigh high;
+};
+template <typename TLow, typename THigh>
+SplitTurn<TLow, THigh> Split(TLow low, THigh high) {
+  return {low, high};
+}
+
 // The real and imaginary parts of w^2 from those of w, each in both lanes.
 template <typename V>
 inline void SquareParts(V c, V s, V* c2, V* s2) {
