@@ -35,7 +35,7 @@ void BM_RealFftForward(benchmark::State& state) {
   }
   state.SetItemsProcessed(state.iterations());
 }
-BENCHMARK(BM_RealFftForward)->Arg(512)->Arg(2048)->Arg(4096);
+BENCHMARK(BM_RealFftForward)->Arg(512)->Arg(1024)->Arg(2048)->Arg(4096);
 
 #ifdef CLIPWEAVER_BENCH_FFTW
 // The reference: FFTW's planned double real-to-complex transform, with the
@@ -60,7 +60,7 @@ void BM_FftwR2cMeasure(benchmark::State& state) {
   fftw_free(out);
   fftw_free(data);
 }
-BENCHMARK(BM_FftwR2cMeasure)->Arg(512)->Arg(2048)->Arg(4096);
+BENCHMARK(BM_FftwR2cMeasure)->Arg(512)->Arg(1024)->Arg(2048)->Arg(4096);
 #endif
 
 }  // namespace
