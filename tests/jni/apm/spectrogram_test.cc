@@ -5,6 +5,7 @@
 #include <algorithm>
 #include <cmath>
 #include <random>
+#include <utility>
 
 namespace apm {
 namespace {
@@ -17,6 +18,12 @@ std::vector<float> Noise(size_t count, unsigned seed) {
   std::vector<float> samples(count);
   for (float& s : samples) s = sample(random);
   return samples;
+}
+
+TEST(Spectrogram, NextPowerOfTwo) {
+  const std::pair<int32_t, int32_t> cases[] = {
+      {-5, 0}, {0, 0}, {1, 1}, {2, 2}, {3, 4}, {1764, 2048}, {2048, 2048}, {1 << 30, 1 << 30}};
+  for (const auto& [n, expected] : cases) EXPECT_EQ(NextPowerOfTwo(n), expected) << n;
 }
 
 // A failed set-up leaves the spectrogram unusable until a good one.
