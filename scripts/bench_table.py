@@ -92,8 +92,8 @@ if "clipweaver" in programs:
     ratio = ""
     if "aubiotrack" in programs:
         ref = statistics.median(c for c, _ in programs["aubiotrack"])
-        ratio = f"{cpu / ref:.2f}x aubiotrack's {ref:.2f} s"
-    rows.append(("`clipweaver beats`, 180 s stereo WAV, CPU", f"{cpu:.2f} s (peak {rss:.0f} MiB)", ratio))
+        ratio = f"{cpu / ref:.2f}x aubiotrack's {ref:.3f} s"
+    rows.append(("`clipweaver beats`, 180 s stereo WAV, CPU", f"{cpu:.3f} s (peak {rss:.0f} MiB)", ratio))
 
 path = os.path.join(out, "instructions.txt")
 if os.path.exists(path):
@@ -115,7 +115,8 @@ if os.path.exists(path):
             rows.append((f"native memory, {minutes} min stereo {kind}, streamed", f"{native} MiB",
                          f"{per_second} KiB per second of audio"))
 
-print(f"Measured on {cpu_model()}, {os.cpu_count()} cores; medians of 5 runs.\n")
+print(f"Measured on {cpu_model()}, {os.cpu_count()} cores; medians of 5 runs (11 for whole"
+      " programs).\n")
 print("| measure | value | comparison |")
 print("|---|---|---|")
 for row in rows:
