@@ -3,6 +3,7 @@
 // when installed.
 #include <benchmark/benchmark.h>
 
+#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <random>
@@ -32,28 +33,43 @@ std::vector<int16_t> Noise(size_t samples) {
   return noise;
 }
 
-void ReportFrames(benchmark::State& state, int64_t frames) {
-  state.counters["frames/s"] = benchmark::Counter(static_cast<double>(frames),
-                                                  benchmark::Counter::kIsRate);
+// Each converter takes one block per Run() and returns the output frames
+// it made.
+class OurResampler {
+ public:
+  OurResampler(int channels, bool stereo_output)
+      : resampler_(norvane::AudioResampler::create(
+            16, channels, kOutputRate, norvane::AudioResampler::QUALITY_LOW, stereo_output)),
+        input_(Noise(kInputFrames * channels)),
+        output_(2 * kInputFrames * 2),
+        output_channels_(channels == 2 || stereo_output ? 2 : 1) {
+    resampler_->setSourceSampleRate(kInputRate);
+    resampler_->setVolume(1.0f, 0.5f);
+  }
+  int64_t Run() {
+    resampler_->resample(output_.data(), input_.data(), kInputFrames);
+    benchmark::ClobberMemory();
+    return resampler_->getOutputSampleCount(kInputFrames) / output_channels_;
+  }
+
+ private:
+  std::unique_ptr<norvane::AudioResampler> resampler_;
+  std::vector<int16_t> input_;
+  std::vector<int16_t> output_;
+  int output_channels_;
+};
+
+template <typename Converter>
+void MeasureFrames(benchmark::State& state, Converter* converter) {
+  int64_t frames = 0;
+  for (auto _ : state) frames += converter->Run();
+  state.counters["frames/s"] =
+      benchmark::Counter(static_cast<double>(frames), benchmark::Counter::kIsRate);
 }
 
 void BM_LinearResampler(benchmark::State& state) {
-  const int channels = static_cast<int>(state.range(0));
-  const bool stereoOutput = state.range(1) != 0;
-  std::unique_ptr<norvane::AudioResampler> resampler(norvane::AudioResampler::create(
-      16, channels, kOutputRate, norvane::AudioResampler::QUALITY_LOW, stereoOutput));
-  resampler->setSourceSampleRate(kInputRate);
-  resampler->setVolume(1.0f, 0.5f);
-  const std::vector<int16_t> input = Noise(kInputFrames * channels);
-  std::vector<int16_t> output(2 * kInputFrames * 2);
-  const int outputChannels = channels == 2 || stereoOutput ? 2 : 1;
-  int64_t frames = 0;
-  for (auto _ : state) {
-    resampler->resample(output.data(), input.data(), kInputFrames);
-    benchmark::ClobberMemory();
-    frames += static_cast<int64_t>(resampler->getOutputSampleCount(kInputFrames)) / outputChannels;
-  }
-  ReportFrames(state, frames);
+  OurResampler ours(static_cast<int>(state.range(0)), state.range(1) != 0);
+  MeasureFrames(state, &ours);
 }
 BENCHMARK(BM_LinearResampler)
     ->ArgNames({"channels", "stereo_out"})
@@ -61,55 +77,112 @@ BENCHMARK(BM_LinearResampler)
     ->Args({1, 1})
     ->Args({2, 0});
 
+// Ours and a reference in alternating batches, each timed apart: batches
+// a moment apart see the same load of a shared machine, so the ratio of
+// their speeds holds where separate runs' speeds move with the load.
+template <typename Reference>
+void MeasureSpeedup(benchmark::State& state) {
+  const int channels = static_cast<int>(state.range(0));
+  OurResampler ours(channels, false);
+  Reference reference(channels);
+  using Clock = std::chrono::steady_clock;
+  struct Tally {
+    Clock::duration time{};
+    int64_t frames = 0;
+  } our_tally, reference_tally;
+  constexpr int kBatch = 64;
+  const auto batch = [](auto& converter, Tally* tally) {
+    const Clock::time_point start = Clock::now();
+    for (int i = 0; i < kBatch; ++i) tally->frames += converter.Run();
+    tally->time += Clock::now() - start;
+  };
+  bool ours_first = true;
+  for (auto _ : state) {
+    if (ours_first) {
+      batch(ours, &our_tally);
+      batch(reference, &reference_tally);
+    } else {
+      batch(reference, &reference_tally);
+      batch(ours, &our_tally);
+    }
+    ours_first = !ours_first;
+  }
+  const auto speed = [](const Tally& tally) {
+    return static_cast<double>(tally.frames) / std::chrono::duration<double>(tally.time).count();
+  };
+  state.counters["speedup"] = speed(our_tally) / speed(reference_tally);
+}
+
 #ifdef CLIPWEAVER_BENCH_SAMPLERATE
 // Float data, its native format.
-void BM_SamplerateLinear(benchmark::State& state) {
-  const int channels = static_cast<int>(state.range(0));
-  int error = 0;
-  SRC_STATE* converter = src_new(SRC_LINEAR, channels, &error);
-  std::vector<float> input(kInputFrames * channels);
-  const std::vector<int16_t> noise = Noise(input.size());
-  src_short_to_float_array(noise.data(), input.data(), static_cast<int>(input.size()));
-  std::vector<float> output(2 * kInputFrames * channels);
-  SRC_DATA data = {};
-  data.data_in = input.data();
-  data.data_out = output.data();
-  data.input_frames = kInputFrames;
-  data.output_frames = 2 * kInputFrames;
-  data.src_ratio = static_cast<double>(kOutputRate) / kInputRate;
-  int64_t frames = 0;
-  for (auto _ : state) {
-    src_process(converter, &data);
-    benchmark::ClobberMemory();
-    frames += data.output_frames_gen;
+class SamplerateLinear {
+ public:
+  explicit SamplerateLinear(int channels)
+      : input_(kInputFrames * channels), output_(2 * kInputFrames * channels) {
+    int error = 0;
+    converter_ = src_new(SRC_LINEAR, channels, &error);
+    const std::vector<int16_t> noise = Noise(input_.size());
+    src_short_to_float_array(noise.data(), input_.data(), static_cast<int>(input_.size()));
+    data_.data_in = input_.data();
+    data_.data_out = output_.data();
+    data_.input_frames = kInputFrames;
+    data_.output_frames = 2 * kInputFrames;
+    data_.src_ratio = static_cast<double>(kOutputRate) / kInputRate;
   }
-  ReportFrames(state, frames);
-  src_delete(converter);
+  ~SamplerateLinear() { src_delete(converter_); }
+  int64_t Run() {
+    src_process(converter_, &data_);
+    benchmark::ClobberMemory();
+    return data_.output_frames_gen;
+  }
+
+ private:
+  std::vector<float> input_;
+  std::vector<float> output_;
+  SRC_STATE* converter_;
+  SRC_DATA data_ = {};
+};
+
+void BM_SamplerateLinear(benchmark::State& state) {
+  SamplerateLinear reference(static_cast<int>(state.range(0)));
+  MeasureFrames(state, &reference);
 }
 BENCHMARK(BM_SamplerateLinear)->ArgName("channels")->Arg(1)->Arg(2);
+void BM_SpeedupOverSamplerate(benchmark::State& state) { MeasureSpeedup<SamplerateLinear>(state); }
+BENCHMARK(BM_SpeedupOverSamplerate)->ArgName("channels")->Arg(1)->Arg(2);
 #endif
 
 #ifdef CLIPWEAVER_BENCH_SPEEXDSP
-void BM_SpeexQuality0(benchmark::State& state) {
-  const int channels = static_cast<int>(state.range(0));
-  int error = 0;
-  SpeexResamplerState* resampler =
-      speex_resampler_init(channels, kInputRate, kOutputRate, 0, &error);
-  const std::vector<int16_t> input = Noise(kInputFrames * channels);
-  std::vector<int16_t> output(2 * kInputFrames * channels);
-  int64_t frames = 0;
-  for (auto _ : state) {
-    spx_uint32_t inputFrames = kInputFrames;
-    spx_uint32_t outputFrames = 2 * kInputFrames;
-    speex_resampler_process_interleaved_int(resampler, input.data(), &inputFrames,
-                                            output.data(), &outputFrames);
-    benchmark::ClobberMemory();
-    frames += outputFrames;
+class SpeexQuality0 {
+ public:
+  explicit SpeexQuality0(int channels)
+      : input_(Noise(kInputFrames * channels)), output_(2 * kInputFrames * channels) {
+    int error = 0;
+    resampler_ = speex_resampler_init(channels, kInputRate, kOutputRate, 0, &error);
   }
-  ReportFrames(state, frames);
-  speex_resampler_destroy(resampler);
+  ~SpeexQuality0() { speex_resampler_destroy(resampler_); }
+  int64_t Run() {
+    spx_uint32_t input_frames = kInputFrames;
+    spx_uint32_t output_frames = 2 * kInputFrames;
+    speex_resampler_process_interleaved_int(resampler_, input_.data(), &input_frames,
+                                            output_.data(), &output_frames);
+    benchmark::ClobberMemory();
+    return output_frames;
+  }
+
+ private:
+  std::vector<int16_t> input_;
+  std::vector<int16_t> output_;
+  SpeexResamplerState* resampler_;
+};
+
+void BM_SpeexQuality0(benchmark::State& state) {
+  SpeexQuality0 reference(static_cast<int>(state.range(0)));
+  MeasureFrames(state, &reference);
 }
 BENCHMARK(BM_SpeexQuality0)->ArgName("channels")->Arg(1)->Arg(2);
+void BM_SpeedupOverSpeex(benchmark::State& state) { MeasureSpeedup<SpeexQuality0>(state); }
+BENCHMARK(BM_SpeedupOverSpeex)->ArgName("channels")->Arg(1)->Arg(2);
 #endif
 
 }  // namespace

@@ -72,10 +72,11 @@ for channels, stereo_out, label in [(1, 0, "mono"), (1, 1, "mono to stereo"), (2
     if not ours:
         continue
     ratios = []
-    for ref, ref_label in [("BM_SamplerateLinear", "libsamplerate linear"), ("BM_SpeexQuality0", "speexdsp q0")]:
-        theirs = frames_per_second(f"{ref}/channels:{channels}")
-        if theirs and not stereo_out:
-            ratios.append(f"{ours / theirs:.1f}x {ref_label}")
+    for ref, ref_label in [("BM_SpeedupOverSamplerate", "libsamplerate linear"),
+                           ("BM_SpeedupOverSpeex", "speexdsp q0")]:
+        both = resampler.get(f"{ref}/channels:{channels}")
+        if both and not stereo_out:
+            ratios.append(f"{both['speedup']:.1f}x {ref_label}")
     rows.append((f"resampler 44.1 to 48 kHz, {label}", f"{ours / 1e6:.0f} M frames/s", ", ".join(ratios)))
 
 programs = {}
