@@ -2,12 +2,12 @@
 #include <benchmark/benchmark.h>
 
 #include <algorithm>
-#include <chrono>
 #include <cmath>
 #include <random>
 #include <vector>
 
 #include "base/aligned_allocator.h"
+#include "bench/alternating_batches.h"
 #include "fft/real_fft.h"
 
 #ifdef CLIPWEAVER_BENCH_FFTW
@@ -94,34 +94,14 @@ void BM_FftwR2cMeasure(benchmark::State& state) {
 }
 BENCHMARK(BM_FftwR2cMeasure)->Arg(512)->Arg(1024)->Arg(2048)->Arg(4096);
 
-// Both in alternating batches, each timed apart: on a shared machine the
-// times of separate runs move with the load, while batches a few
-// microseconds apart see the same load, so their ratio holds.
+// Both in alternating batches (alternating_batches.h).
 void BM_RealFftOverFftw(benchmark::State& state) {
   const int n = static_cast<int>(state.range(0));
   OurTransform ours(n);
   FftwTransform fftw(n);
-  using Clock = std::chrono::steady_clock;
-  Clock::duration our_time{}, fftw_time{};
-  bool ours_first = true;
-  constexpr int kBatch = 32;
-  for (auto _ : state) {
-    const auto batch = [](auto& transform, Clock::duration* total) {
-      const Clock::time_point start = Clock::now();
-      for (int i = 0; i < kBatch; ++i) transform.Run();
-      *total += Clock::now() - start;
-    };
-    if (ours_first) {
-      batch(ours, &our_time);
-      batch(fftw, &fftw_time);
-    } else {
-      batch(fftw, &fftw_time);
-      batch(ours, &our_time);
-    }
-    ours_first = !ours_first;
-  }
-  state.counters["ratio"] = std::chrono::duration<double>(our_time).count() /
-                            std::chrono::duration<double>(fftw_time).count();
+  const BatchSeconds seconds =
+      TimeInAlternatingBatches(state, 32, [&] { ours.Run(); }, [&] { fftw.Run(); });
+  state.counters["ratio"] = seconds.first / seconds.second;
 }
 BENCHMARK(BM_RealFftOverFftw)->Arg(512)->Arg(1024)->Arg(2048)->Arg(4096);
 #endif

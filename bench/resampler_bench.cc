@@ -3,12 +3,12 @@
 // when installed.
 #include <benchmark/benchmark.h>
 
-#include <chrono>
 #include <cstdint>
 #include <memory>
 #include <random>
 #include <vector>
 
+#include "bench/alternating_batches.h"
 #include "resampler/audio_resampler.h"
 
 #ifdef CLIPWEAVER_BENCH_SAMPLERATE
@@ -77,40 +77,19 @@ BENCHMARK(BM_LinearResampler)
     ->Args({1, 1})
     ->Args({2, 0});
 
-// Ours and a reference in alternating batches, each timed apart: batches
-// a moment apart see the same load of a shared machine, so the ratio of
-// their speeds holds where separate runs' speeds move with the load.
+// Ours and a reference in alternating batches (alternating_batches.h): the
+// ratio of their speeds.
 template <typename Reference>
 void MeasureSpeedup(benchmark::State& state) {
   const int channels = static_cast<int>(state.range(0));
   OurResampler ours(channels, false);
   Reference reference(channels);
-  using Clock = std::chrono::steady_clock;
-  struct Tally {
-    Clock::duration time{};
-    int64_t frames = 0;
-  } our_tally, reference_tally;
-  constexpr int kBatch = 64;
-  const auto batch = [](auto& converter, Tally* tally) {
-    const Clock::time_point start = Clock::now();
-    for (int i = 0; i < kBatch; ++i) tally->frames += converter.Run();
-    tally->time += Clock::now() - start;
-  };
-  bool ours_first = true;
-  for (auto _ : state) {
-    if (ours_first) {
-      batch(ours, &our_tally);
-      batch(reference, &reference_tally);
-    } else {
-      batch(reference, &reference_tally);
-      batch(ours, &our_tally);
-    }
-    ours_first = !ours_first;
-  }
-  const auto speed = [](const Tally& tally) {
-    return static_cast<double>(tally.frames) / std::chrono::duration<double>(tally.time).count();
-  };
-  state.counters["speedup"] = speed(our_tally) / speed(reference_tally);
+  int64_t our_frames = 0, reference_frames = 0;
+  const BatchSeconds seconds = TimeInAlternatingBatches(
+      state, 64, [&] { our_frames += ours.Run(); },
+      [&] { reference_frames += reference.Run(); });
+  state.counters["speedup"] =
+      (our_frames / seconds.first) / (reference_frames / seconds.second);
 }
 
 #ifdef CLIPWEAVER_BENCH_SAMPLERATE
