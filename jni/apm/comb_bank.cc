@@ -34,9 +34,9 @@ void CombBank::Reset(const std::vector<int32_t>& lag_frames,
   input_weight_ = input_weight;
   start_factor_ = start_factor;
   rows_ = ring_rows;
-  outputs_.assign(static_cast<size_t>(rows_) * lag_frames.size(), 0.0);
+  outputs_.assign(lag_frames.size(), 0.0);
   // exp(0), as the outputs start at 0.
-  exp_outputs_.assign(outputs_.size(), 1.0f);
+  exp_outputs_.assign(static_cast<size_t>(rows_) * lag_frames.size(), 1.0f);
 }
 
 const double* CombBank::Filter(const std::vector<float>& detection,
@@ -47,17 +47,15 @@ const double* CombBank::Filter(const std::vector<float>& detection,
   const int32_t* lags = lag_frames_.data();
   const size_t count = lag_frames_.size();
   const float x = detection[t];
-  const size_t at = static_cast<size_t>(t % rows_) * count;
-  double* out = outputs_.data() + at;
-  float* exp_out = exp_outputs_.data() + at;
+  double* out = outputs_.data();
+  float* exp_out = exp_row(t);
   for (size_t i = 0; i < count; ++i) {
     const int32_t back = t - lags[i];
     float product = back >= 0 ? detection[back] * x
                               : static_cast<float>(start * x);
     if (weight < 1.0) {
       const float previous =
-          back >= 0 ? exp_outputs_[static_cast<size_t>(back % rows_) * count + i]
-                    : static_cast<float>(start);
+          back >= 0 ? exp_row(back)[i] : static_cast<float>(start);
       product =
           static_cast<float>(previous * (1.0 - weight) + weight * product);
     }

@@ -18,22 +18,28 @@ class CombBank {
  public:
   // input_weight of 1 or more leaves the filters without feedback;
   // start_factor stands for the input and the output one period before
-  // the first frame. The outputs of ring_rows frames are kept; reading one
+  // the first frame. The feedback of ring_rows frames is kept; reading one
   // period back needs the longest lag plus one.
   void Reset(const std::vector<int32_t>& lag_frames, int32_t ring_rows,
              double input_weight, double start_factor);
 
-  // Filters frame t (0, 1, ... in turn) and returns every lag's output.
+  // Filters frame t (0, 1, ... in turn) and returns every lag's output,
+  // valid until the next call.
   const double* Filter(const std::vector<float>& detection, int32_t t);
 
  private:
+  float* exp_row(int32_t t) {
+    return exp_outputs_.data() + static_cast<size_t>(t % rows_) * lag_frames_.size();
+  }
+
   std::vector<int32_t> lag_frames_;
   double input_weight_ = 0.0;
   double start_factor_ = 0.0;
   int32_t rows_ = 0;
+  // This frame's outputs.
   std::vector<double> outputs_;
-  // The feedback reads every output once, through exp and as a float:
-  // kept so, from when the output was made.
+  // The feedback reads every output once, through exp and as a float: a
+  // ring of ring_rows frames of them, kept so from when each was made.
   std::vector<float> exp_outputs_;
 };
 
